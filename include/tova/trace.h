@@ -1,0 +1,36 @@
+/*
+ * tova — call tracing. An indented tree of entered and left functions on
+ * standard output; exported so that client programs can nest their own lines
+ * with the library's. A single-threaded debugging aid: at most 5002 lines are
+ * written per process, after which the process ends.
+ */
+#ifndef TOVA_TRACE_H
+#define TOVA_TRACE_H
+
+#include "status.h"
+
+TOVA_EXTERN_C_BEGIN
+
+/* Variadic forms use the platform's default calling convention. */
+TOVA_API void DebugEnter(const char* format, ...);
+TOVA_API void DebugEnterExit(const char* format, ...);
+TOVA_API int32_t DebugExit(const char* format, ...); /* returns the line counter */
+TOVA_API void DebugPrint(const char* format, ...);
+
+/* One-string forms for callers that cannot call variadic functions. */
+TOVA_API void TOVA_CALL DebugEnterStr(const char* text);
+TOVA_API void TOVA_CALL DebugEnterExitStr(const char* text);
+TOVA_API int32_t TOVA_CALL DebugExitStr(const char* text);
+TOVA_API void TOVA_CALL DebugPrintStr(const char* text);
+
+TOVA_API void TOVA_CALL PutFunctionName(const char* nameSource);
+TOVA_API const char* TOVA_CALL GetFunctionName(void);
+TOVA_API void TOVA_CALL printnblank(int32_t count);
+
+/* Switches the tracing of the file-open and logical-block layer; returns the
+ * stored truth value (0 or 1). */
+TOVA_API int32_t TOVA_CALL DebugFileIO(int32_t on);
+
+TOVA_EXTERN_C_END
+
+#endif /* TOVA_TRACE_H */

@@ -1,0 +1,19 @@
+/* Compiles every public header as C99 and calls a few exported functions
+ * through the shared library. */
+#include <stdio.h>
+#include <string.h>
+
+#include "tova/grd.h"
+#include "tova/rcf.h"
+#include "tova/status.h"
+#include "tova/trace.h"
+
+int main(void) {
+    if (rcfGetVersionCurrent() != 104) return 1;
+    if (strcmp(rcfSimpName(RCF_DOUBLE), "double") != 0) return 2;
+    if (rcfSimpSize(RCF_INT2) != 2) return 3;
+    if (grdDebugOn(0) != 0) return 4;
+    if (grdAddErrorHandler(2020, NULL) != 19) return 5;
+    puts("C API ok");
+    return 0;
+}

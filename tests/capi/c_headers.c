@@ -7,6 +7,7 @@
 #include "tova/rcf.h"
 #include "tova/status.h"
 #include "tova/trace.h"
+#include "tova/workspace.h"
 
 int main(void) {
     if (rcfGetVersionCurrent() != 104) return 1;
@@ -14,6 +15,7 @@ int main(void) {
     if (rcfSimpSize(RCF_INT2) != 2) return 3;
     if (grdDebugOn(0) != 0) return 4;
     if (grdAddErrorHandler(2020, NULL) != 19) return 5;
+    if (TdShortCut_IsShortcut("a.LNK") != 1) return 6;
     puts("C API ok");
     return 0;
 }

@@ -8,7 +8,6 @@
 #include <initializer_list>
 #include <limits>
 
-#include "common/capi.h"
 #include "grd/grdio.h"
 #include "qty/qty.h"
 
@@ -317,63 +316,51 @@ GrdItem* grdHeaderItem(GrdHeader* header, int32_t itemNo) noexcept {
 namespace {
 
 // Runs one null test with its trace lines.
-int32_t checkNotNull(const char* name, const void* p, HeaderHandle header, const char* module, int32_t line) {
-    const bool trace = tova::traceApiOn();
-    if (trace) DebugEnter(name);
-    const int32_t status =
-        p != nullptr ? F_NO_ERROR : grdReportError(header, nullptr, 0, F_ERR_ARGUMENT, module, line);
-    if (trace) DebugExit("[%d]", status);
-    return status;
+int32_t checkNotNull(const char* name, const void* p, const char* module, int32_t line) {
+    GrdApiTrace trace(name);
+    return trace.done(p != nullptr ? F_NO_ERROR : grdReportError(nullptr, nullptr, 0, F_ERR_ARGUMENT, module, line));
 }
 
 }  // namespace
 
 int32_t grdCheckHeader(HeaderHandle header, const char* module, int32_t line) {
-    return checkNotNull("grdCheckHeader", header, nullptr, module, line);
+    return checkNotNull("grdCheckHeader", header, module, line);
 }
 
 int32_t grdCheckFile(FileHandle file, const char* module, int32_t line) {
-    return checkNotNull("grdCheckFile", file, nullptr, module, line);
+    return checkNotNull("grdCheckFile", file, module, line);
 }
 
 int32_t grdCheckHeaderFile(HeaderHandle header, FileHandle file, const char* module, int32_t line) {
-    const bool trace = tova::traceApiOn();
-    if (trace) DebugEnter("grdCheckHeaderFile");
-    int32_t status = grdCheckHeader(header, module, line);
-    if (status == F_NO_ERROR) status = grdCheckFile(file, module, line);
-    if (trace) DebugExit("[%d]", status);
-    return status;
+    GrdApiTrace trace("grdCheckHeaderFile");
+    const int32_t status = grdCheckHeader(header, module, line);
+    return trace.done(status != F_NO_ERROR ? status : grdCheckFile(file, module, line));
 }
 
 int32_t grdCheckHeaderItemNo(HeaderHandle header, int32_t itemNo, const char* module, int32_t line) {
-    const bool trace = tova::traceApiOn();
-    if (trace) DebugEnter("grdCheckHeaderItemNo %d", itemNo);
+    GrdApiTrace trace("grdCheckHeaderItemNo %d", itemNo);
     int32_t status = grdCheckHeader(header, module, line);
     if (status == F_NO_ERROR && (itemNo < 1 || itemNo > header->noOfItems))
         status = grdReportError(header, nullptr, 0, F_ERR_ITEMNO, module, line);
-    if (trace) DebugExit("[%d]", status);
-    return status;
+    return trace.done(status);
 }
 
 int32_t grdCheckItem(ItemHandle item, const char* module, int32_t line) {
-    return checkNotNull("grdCheckItem", item, nullptr, module, line);
+    return checkNotNull("grdCheckItem", item, module, line);
 }
 
 int32_t grdCheckVector(ItemHandle vector, const char* module, int32_t line) {
-    return checkNotNull("grdCheckVector", vector, nullptr, module, line);
+    return checkNotNull("grdCheckVector", vector, module, line);
 }
 
 int32_t grdCheckVectorFile(ItemHandle vector, FileHandle file, const char* module, int32_t line) {
-    const bool trace = tova::traceApiOn();
-    if (trace) DebugEnter("grdCheckVectorFile");
-    int32_t status = grdCheckVector(vector, module, line);
-    if (status == F_NO_ERROR) status = grdCheckFile(file, module, line);
-    if (trace) DebugExit("[%d]", status);
-    return status;
+    GrdApiTrace trace("grdCheckVectorFile");
+    const int32_t status = grdCheckVector(vector, module, line);
+    return trace.done(status != F_NO_ERROR ? status : grdCheckFile(file, module, line));
 }
 
 int32_t grdCheckCustomBlock(CustomBlockHandle block, const char* module, int32_t line) {
-    return checkNotNull("grdCheckCustomBlock", block, nullptr, module, line);
+    return checkNotNull("grdCheckCustomBlock", block, module, line);
 }
 
 // ---- Exported: header object ----------------------------------------------------------------
@@ -412,6 +399,7 @@ int32_t TOVA_CALL grdHeaderDestroy(HeaderHandle* header) {
 }
 
 const char* TOVA_CALL grdFileTypeStr(int32_t fileType) {
+    GrdApiTrace trace("grdFileTypeStr %d", fileType);
     switch (fileType) {
         case F_UNDEFINED_FILE_TYPE:
             return "F_UNDEFINED_FILE_TYPE";
@@ -431,6 +419,7 @@ const char* TOVA_CALL grdFileTypeStr(int32_t fileType) {
 }
 
 const char* TOVA_CALL grdTimeAxisTypeStr(int32_t timeAxisType) {
+    GrdApiTrace trace("grdTimeAxisTypeStr %d", timeAxisType);
     switch (timeAxisType) {
         case F_UNDEFINED_TAXIS:
             return "F_UNDEFINED_TAXIS";
@@ -447,7 +436,10 @@ const char* TOVA_CALL grdTimeAxisTypeStr(int32_t timeAxisType) {
     }
 }
 
-const char* TOVA_CALL grdSimpleTypeStr(int32_t simpleType) { return rcfSimpName(simpleType); }
+const char* TOVA_CALL grdSimpleTypeStr(int32_t simpleType) {
+    GrdApiTrace trace("grdSimpleTypeStr %d", simpleType);
+    return rcfSimpName(simpleType);
+}
 
 int32_t TOVA_CALL grdGetVersionCurrent(void) {
     GrdApiTrace trace("grdGetIOVersionNo");

@@ -2,6 +2,7 @@
 // setters (file-type family, sizes, steps, arrays, static items), the size
 // table, dimensions and geometry, unit conversion of axis values (including
 // the in-place conversion of coordinate arrays) and statistics re-allocation.
+#include <cmath>
 #include <vector>
 
 #include "test_header_support.h"
@@ -92,9 +93,10 @@ TEST_F(Axes, CoordinateAxesCopyTheirArrays) {
     EXPECT_EQ(az[2], -2.0);
 
     // Curvilinear: one value per node, (X+1)(Y+1) = 12 for 3 x 2.
-    std::vector<double> nx(12), ny(12), nz(24);
+    std::vector<double> nx(24), ny(24), nz(24);  // room for the 3-D case below
     for (size_t i = 0; i < nz.size(); ++i) {
-        if (i < 12) nx[i] = static_cast<double>(i), ny[i] = 100.0 + static_cast<double>(i);
+        nx[i] = static_cast<double>(i);
+        ny[i] = 100.0 + static_cast<double>(i);
         nz[i] = 1000.0 + static_cast<double>(i);
     }
     ASSERT_EQ(grdSetItemAxisCurveLinearD2(item, 0, 3, 2, nx.data(), ny.data(), 0), 0);

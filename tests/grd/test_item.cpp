@@ -42,7 +42,7 @@ TEST_F(Item, InfoTakesOnlyUnitsOfTheQuantityType) {
 
     ASSERT_EQ(grdSetItemInfo(h, item, kLength, "depth", meter, 1), 0);
     EXPECT_EQ(grdSetItemInfo(h, item, kLength, "other", QTY_UNIT_SECOND, 2), 2020);
-    EXPECT_EQ(takeCodes(), Codes{2020});
+    EXPECT_TRUE(takeCodes().empty());  // 2020 has a slot that no handler can be set for
     int32_t type = 0, unit = 0, dataType = 0;
     const char *typeText = nullptr, *name = nullptr, *unitText = nullptr;
     ASSERT_EQ(grdGetItemInfo(item, &type, &typeText, &name, &unit, &unitText, &dataType), 0);
@@ -155,7 +155,6 @@ TEST_F(Item, UpdateInfoKeepsTheStoredNameLength) {
     grdGetItemInfo_(item, nullptr, &name, nullptr, nullptr);
     EXPECT_STREQ(name, "a muc");
     EXPECT_EQ(grdUpdateItemInfo(h, item, kLength, "zz", QTY_UNIT_SECOND), 2020);
-    EXPECT_EQ(takeCodes(), Codes{2020});
     grdGetItemInfo_(item, nullptr, &name, nullptr, nullptr);
     EXPECT_STREQ(name, "a muc");
 }

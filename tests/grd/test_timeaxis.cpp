@@ -1,6 +1,8 @@
 // Time axes: setters per file-type family, date and time text rules, the
 // getters (calendar getters with and without the modify-times switch), the
 // date arithmetic and the span of equidistant axes.
+#include <cstdio>
+#include <initializer_list>
 #include <string>
 
 #include "test_header_support.h"
@@ -92,11 +94,11 @@ TEST_F(TimeAxis, SettersReplaceAStoredUnitText) {
 
 TEST_F(TimeAxis, DateAndTimeTextRules) {
     HeaderHandle h = makeHeader(F_EQTIME_FIXEDSPACE_ALLITEMS);
-    for (const char* date : {"2024-1-05", "2024/01/05", "2024-01-0x", "2024-01-051", "", nullptr}) {
+    for (const char* date : std::initializer_list<const char*>{"2024-1-05", "2024/01/05", "2024-01-0x", "2024-01-051", "", nullptr}) {
         EXPECT_EQ(grdSetEqCalendarAxis(h, date, "12:00:00", 1400, 0, 1, 0), 2011) << (date ? date : "null");
     }
     EXPECT_EQ(takeCodes(), Codes(6, 2011));
-    for (const char* time : {"12:00", "12-00-00", "12:00:0a", "1:00:00 ", nullptr}) {
+    for (const char* time : std::initializer_list<const char*>{"12:00", "12-00-00", "12:00:0a", "1:00:00 ", nullptr}) {
         EXPECT_EQ(grdSetEqCalendarAxis(h, "2024-01-05", time, 1400, 0, 1, 0), 2012) << (time ? time : "null");
     }
     EXPECT_EQ(takeCodes(), Codes(5, 2012));

@@ -77,7 +77,7 @@ void GrdText::overwriteKeepLength(const char* text) noexcept {
     if (stored == 0) return;
     const size_t n = text ? std::strlen(text) : 0;
     const size_t copied = n < stored ? n : stored;
-    std::memmove(p_.get(), text, copied);
+    if (copied > 0) std::memmove(p_.get(), text, copied);
     std::memset(p_.get() + copied, ' ', stored - copied);
 }
 

@@ -157,6 +157,9 @@ TEST_F(Item, UpdateInfoKeepsTheStoredNameLength) {
     EXPECT_EQ(grdUpdateItemInfo(h, item, kLength, "zz", QTY_UNIT_SECOND), 2020);
     grdGetItemInfo_(item, nullptr, &name, nullptr, nullptr);
     EXPECT_STREQ(name, "a muc");
+    ASSERT_EQ(grdUpdateItemInfo(h, item, kLength, nullptr, meter), 0);  // no name: all blanks
+    grdGetItemInfo_(item, nullptr, &name, nullptr, nullptr);
+    EXPECT_STREQ(name, "     ");
 }
 
 TEST_F(Item, SettingsAreStoredUnchanged) {

@@ -89,6 +89,11 @@ TEST_F(Records, LayoutOnDisk) {
     rcfSeek64(f_, 0, 0, 2);
     EXPECT_EQ(rcfLrecWrite(f_, RCF_FLOAT, 0, nullptr), 0);
     EXPECT_EQ(rcfTell64(f_), base_ + 35);
+    // A record of more than 4 GiB does not fit the format and is refused.
+    const double d = 0;
+    EXPECT_EQ(rcfLrecWrite(f_, RCF_DOUBLE, 0x20000000u, &d), F_ERR_TYPE);
+    EXPECT_EQ(rcfGetError(f_), F_ERR_TYPE);
+    EXPECT_EQ(rcfTell64(f_), base_ + 35);
 }
 
 TEST_F(Records, SkipMovesOverOneRecordOrMark) {
@@ -222,6 +227,23 @@ TEST_F(Records, BlockMarksAreNotDataRecords) {
     EXPECT_EQ(type, RCF_BLOCK);
     EXPECT_EQ(rcfPeekError(f_), 0);
     EXPECT_EQ(rcfQuery(f_, nullptr), RCF_BLOCK);
+}
+
+TEST(RcfNullHandle, EveryOperationHasAFallback) {
+    EXPECT_EQ(rcfGetError(nullptr), F_ERR_ARGUMENT);
+    EXPECT_EQ(rcfPeekError(nullptr), F_ERR_ARGUMENT);
+    EXPECT_EQ(rcfLrecWrite(nullptr, RCF_INT4, 1, nullptr), F_ERR_ARGUMENT);
+    EXPECT_EQ(rcfLrecRead(nullptr, RCF_INT4, 1, nullptr), 0u);
+    EXPECT_EQ(rcfLrecReadAlloc(nullptr, nullptr, nullptr), nullptr);
+    EXPECT_EQ(rcfQuery(nullptr, nullptr), 0);
+    EXPECT_EQ(rcfSkip(nullptr), 0);
+    EXPECT_EQ(rcfTell64(nullptr), -1);
+    EXPECT_EQ(rcfTell(nullptr), -1);
+    rcfSeek64(nullptr, 0, 0, 0);
+    EXPECT_EQ(rcfGetRCFbase(nullptr), 0u);
+    EXPECT_EQ(rcfGetVersionEditApp(nullptr), 0u);
+    EXPECT_EQ(rcfBlockSkip(nullptr), F_ERR_ARGUMENT);
+    EXPECT_EQ(rcfBlockRead(nullptr, nullptr, nullptr), 0);
 }
 
 TEST_F(Records, ReadAllocHandsOutBuffersToFree) {

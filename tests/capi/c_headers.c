@@ -3,10 +3,12 @@
 #include <stdio.h>
 #include <string.h>
 
+#include "qty/qty.h"
 #include "tova/grd.h"
 #include "tova/rcf.h"
 #include "tova/status.h"
 #include "tova/trace.h"
+#include "tova/workspace.h"
 
 int main(void) {
     if (rcfGetVersionCurrent() != 104) return 1;
@@ -14,6 +16,14 @@ int main(void) {
     if (rcfSimpSize(RCF_INT2) != 2) return 3;
     if (grdDebugOn(0) != 0) return 4;
     if (grdAddErrorHandler(2020, NULL) != 19) return 5;
+    if (TdShortCut_IsShortcut("a.LNK") != 1) return 6;
+    {
+        int32_t metre = 0, foot = 0;
+        double feet = 0.0;
+        if (!qtyGetUnitTag("m", &metre) || !qtyGetUnitTag("ft", &foot)) return 7;
+        if (!qtyItemUnitEqv(QTY_ITEM_GEOMETRY_1D, foot)) return 8;
+        if (!qtyConvertUnit(metre, 0.9144, foot, &feet) || feet < 2.999999 || feet > 3.000001) return 9;
+    }
     puts("C API ok");
     return 0;
 }

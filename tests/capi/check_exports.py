@@ -8,18 +8,15 @@ import subprocess
 import sys
 
 include = pathlib.Path(sys.argv[1])
-# An absent library (libqty before it exists) comes as an empty argument.
-libs = [lib for lib in sys.argv[2:] if lib]
-have_qty = any(pathlib.Path(lib).name.startswith("libqty") for lib in libs)
+libs = sys.argv[2:]
 marked = set()
-decl = re.compile(r"\b(TOVA_API|QTY_API)\b[^;{(]*?\b([A-Za-z_]\w*)\s*\(", re.S)
+decl = re.compile(r"\b(?:TOVA_API|QTY_API)\b[^;{(]*?\b([A-Za-z_]\w*)\s*\(", re.S)
 for header in include.rglob("*.h"):
     text = re.sub(r"/\*.*?\*/", "", header.read_text(), flags=re.S)
     text = re.sub(r"//[^\n]*", "", text)
-    text = re.sub(r"^\s*#.*$", "", text, flags=re.M)  # the macro definitions themselves
+    text = re.sub(r"^[ \t]*#.*$", "", text, flags=re.M)  # the export macros' own definitions
     for m in decl.finditer(text):
-        if m.group(1) == "TOVA_API" or have_qty:
-            marked.add(m.group(2))
+        marked.add(m.group(1))
 
 exported = set()
 for lib in libs:

@@ -350,5 +350,24 @@ private:
     int32_t status_ = 0;
 };
 
+// A traced getter of one value of a handle that check accepts (check is one
+// of the argument checks above); the fallback when it refuses the handle.
+template <class T, class H, class Check, class Fn>
+T grdTracedGet(const char* name, H handle, Check check, const char* module, int32_t line, T fallback, Fn fn) {
+    GrdApiTrace trace(name);
+    if (trace.done(check(handle, module, line)) != F_NO_ERROR) return fallback;
+    return fn(handle);
+}
+
+// A traced operation on a handle that check accepts; fn returns a status.
+// The enter line is format with args.
+template <class H, class Check, class Fn, class... Args>
+int32_t grdTracedDo(H handle, Check check, const char* module, int32_t line, Fn fn, const char* format,
+                    Args... args) {
+    GrdApiTrace trace(format, args...);
+    const int32_t status = check(handle, module, line);
+    return trace.done(status != F_NO_ERROR ? status : fn(handle));
+}
+
 // A text safe to hand to "%s".
 inline const char* grdTraceText(const char* text) noexcept { return text ? text : "(null)"; }

@@ -78,18 +78,13 @@ constexpr const char* kModule = kModGrdIo;
 // A getter of one header field: traced, the fallback for a null header.
 template <class T, class Fn>
 T getField(const char* name, HeaderHandle header, int32_t line, T fallback, Fn fn) {
-    GrdApiTrace trace(name);
-    if (trace.done(grdCheckHeader(header, kModule, line)) != F_NO_ERROR) return fallback;
-    return fn(header);
+    return grdTracedGet(name, header, grdCheckHeader, kModule, line, fallback, fn);
 }
 
-// An operation on a checked header: traced with its arguments; fn returns a
-// status.
+// An operation on a checked header; fn returns a status.
 template <class Fn, class... Args>
 int32_t withHeader(HeaderHandle header, int32_t line, Fn fn, const char* format, Args... args) {
-    GrdApiTrace trace(format, args...);
-    const int32_t status = grdCheckHeader(header, kModule, line);
-    return trace.done(status != F_NO_ERROR ? status : fn(header));
+    return grdTracedDo(header, grdCheckHeader, kModule, line, fn, format, args...);
 }
 
 int32_t setTitle(HeaderHandle header, GrdText GrdHeader::*field, const char* text, int32_t line) {

@@ -24,18 +24,13 @@ int32_t report(const GrdItem* item, int32_t code, int32_t line) {
 // A value getter of an item: traced, the fallback for a null item.
 template <class T, class Fn>
 T getItemValue(const char* name, ItemHandle item, int32_t line, T fallback, Fn fn) {
-    GrdApiTrace trace(name);
-    if (trace.done(grdCheckItem(item, kModule, line)) != F_NO_ERROR) return fallback;
-    return fn(item);
+    return grdTracedGet(name, item, grdCheckItem, kModule, line, fallback, fn);
 }
 
-// An operation on a checked item: traced with its arguments; fn returns a
-// status.
+// An operation on a checked item; fn returns a status.
 template <class Fn, class... Args>
 int32_t withItem(ItemHandle item, int32_t line, Fn fn, const char* format, Args... args) {
-    GrdApiTrace trace(format, args...);
-    const int32_t status = grdCheckItem(item, kModule, line);
-    return trace.done(status != F_NO_ERROR ? status : fn(item));
+    return grdTracedDo(item, grdCheckItem, kModule, line, fn, format, args...);
 }
 
 // An operation on item itemNo of a checked header.
@@ -338,9 +333,8 @@ extern "C" {
 // ---- Item access ---------------------------------------------------------------------
 
 int32_t TOVA_CALL grdGetNoOfItems(HeaderHandle header) {
-    GrdApiTrace trace("grdGetNoOfItems");
-    if (trace.done(grdCheckHeader(header, kModule, __LINE__)) != F_NO_ERROR) return 0;
-    return header->noOfItems;
+    return grdTracedGet("grdGetNoOfItems", header, grdCheckHeader, kModule, __LINE__, 0,
+                        [](HeaderHandle h) { return h->noOfItems; });
 }
 
 ItemHandle TOVA_CALL grdItemD(HeaderHandle header, int32_t itemNo) {
@@ -677,15 +671,13 @@ int32_t TOVA_CALL grdGetEncodeKey(HeaderHandle header, int32_t* xKey, int32_t* y
 }
 
 int32_t TOVA_CALL grdGetEncodeKeySize(HeaderHandle header) {
-    GrdApiTrace trace("grdGetEncodeKeySize");
-    if (trace.done(grdCheckHeader(header, kModule, __LINE__)) != F_NO_ERROR) return 0;
-    return header->keyLength;
+    return grdTracedGet("grdGetEncodeKeySize", header, grdCheckHeader, kModule, __LINE__, 0,
+                        [](HeaderHandle h) { return h->keyLength; });
 }
 
 int32_t TOVA_CALL grdIsFileCompressed(HeaderHandle header) {
-    GrdApiTrace trace("grdIsFileCompressed");
-    if (trace.done(grdCheckHeader(header, kModule, __LINE__)) != F_NO_ERROR) return 0;
-    return header->fileCompressed;
+    return grdTracedGet("grdIsFileCompressed", header, grdCheckHeader, kModule, __LINE__, 0,
+                        [](HeaderHandle h) { return h->fileCompressed; });
 }
 
 HeaderHandle TOVA_CALL grdItemEnableCompression(HeaderHandle header) {

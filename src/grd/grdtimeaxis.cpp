@@ -236,9 +236,8 @@ int32_t TOVA_CALL grdSetNeqCalendarAxis(HeaderHandle header, const char* startDa
 // ---- Getters ---------------------------------------------------------------------------
 
 int32_t TOVA_CALL grdGetTimeAxisType(HeaderHandle header) {
-    GrdApiTrace trace("grdGetTimeAxisType");
-    if (trace.done(grdCheckHeader(header, kModule, __LINE__)) != F_NO_ERROR) return 0;
-    return header->timeAxis.type;
+    return grdTracedGet("grdGetTimeAxisType", header, grdCheckHeader, kModule, __LINE__, 0,
+                        [](HeaderHandle h) { return h->timeAxis.type; });
 }
 
 int32_t TOVA_CALL grdGetEqTimeAxis(HeaderHandle header, int32_t* unit, const char** unitText, double* startTime,

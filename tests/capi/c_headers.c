@@ -7,6 +7,7 @@
 #include "tova/rcf.h"
 #include "tova/status.h"
 #include "tova/trace.h"
+#include "tova/vre.h"
 #include "tova/workspace.h"
 
 int main(void) {
@@ -16,6 +17,14 @@ int main(void) {
     if (grdDebugOn(0) != 0) return 4;
     if (grdAddErrorHandler(2020, NULL) != 19) return 5;
     if (TdShortCut_IsShortcut("a.LNK") != 1) return 6;
+    {
+        VreHandle vre = vreHandleCreate();
+        int32_t first = 0, second = 0;
+        if (vre == NULL) return 10;
+        if (vreGetSymmetry(vre, &first, &second) != 0 || first != 1 || second != 0) return 11;
+        if (vreGetVectorParam(vre, 8) != -1) return 12;
+        vreHandleFree(vre);
+    }
     puts("C API ok");
     return 0;
 }

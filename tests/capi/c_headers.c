@@ -3,6 +3,7 @@
 #include <stdio.h>
 #include <string.h>
 
+#include "qty/qty.h"
 #include "tova/grd.h"
 #include "tova/rcf.h"
 #include "tova/status.h"
@@ -17,6 +18,13 @@ int main(void) {
     if (grdDebugOn(0) != 0) return 4;
     if (grdAddErrorHandler(2020, NULL) != 19) return 5;
     if (TdShortCut_IsShortcut("a.LNK") != 1) return 6;
+    {
+        int32_t metre = 0, foot = 0;
+        double feet = 0.0;
+        if (!qtyGetUnitTag("m", &metre) || !qtyGetUnitTag("ft", &foot)) return 7;
+        if (!qtyItemUnitEqv(QTY_ITEM_GEOMETRY_1D, foot)) return 8;
+        if (!qtyConvertUnit(metre, 0.9144, foot, &feet) || feet < 2.999999 || feet > 3.000001) return 9;
+    }
     {
         VreHandle vre = vreHandleCreate();
         int32_t first = 0, second = 0;

@@ -105,9 +105,12 @@ std::vector<Rec> walk(const std::string& path) {
     uint32_t count = 0;
     for (int32_t type; (type = rcfQuery(f, &count)) != 0;) {
         int32_t value = 0;
-        const bool single = type == RCF_INT4 && count == 1;
-        single ? static_cast<void>(rcfLrecRead(f, RCF_INT4, 1, &value)) : static_cast<void>(rcfSkip(f));
-        recs.push_back({type, count, single ? value : kAny});
+        if (type == RCF_INT4 && count == 1 && rcfLrecRead(f, RCF_INT4, 1, &value) == 1) {
+            recs.push_back({type, count, value});
+        } else {
+            rcfSkip(f);
+            recs.push_back({type, count, kAny});
+        }
     }
     rcfFileClose(&f);
     return recs;

@@ -8,6 +8,7 @@
 #include "tova/rcf.h"
 #include "tova/status.h"
 #include "tova/trace.h"
+#include "tova/vre.h"
 #include "tova/workspace.h"
 
 int main(void) {
@@ -23,6 +24,14 @@ int main(void) {
         if (!qtyGetUnitTag("m", &metre) || !qtyGetUnitTag("ft", &foot)) return 7;
         if (!qtyItemUnitEqv(QTY_ITEM_GEOMETRY_1D, foot)) return 8;
         if (!qtyConvertUnit(metre, 0.9144, foot, &feet) || feet < 2.999999 || feet > 3.000001) return 9;
+    }
+    {
+        VreHandle vre = vreHandleCreate();
+        int32_t first = 0, second = 0;
+        if (vre == NULL) return 10;
+        if (vreGetSymmetry(vre, &first, &second) != 0 || first != 1 || second != 0) return 11;
+        if (vreGetVectorParam(vre, 8) != -1) return 12;
+        vreHandleFree(vre);
     }
     puts("C API ok");
     return 0;

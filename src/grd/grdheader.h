@@ -87,7 +87,7 @@ private:
 
 // ---- Items -------------------------------------------------------------------
 
-// Per-element statistics record (Part of every item when the header's
+// Per-element statistics record (one per element of every item when the header's
 // statistics type is 2 or 3), nine doubles in this order.
 struct GrdElementStats {
     double max;
@@ -106,7 +106,7 @@ static_assert(sizeof(GrdElementStats) == 9 * sizeof(double));
 enum class GrdAxisFamily { Undefined, Equidistant, NonEquidistant, CurveLinear, TimeVarying };
 GrdAxisFamily grdAxisFamily(int32_t axisType) noexcept;
 
-// One item record. A static item (Part of the static-item module) derives
+// One item record. A static item (defined by the static-item module) derives
 // from it and sets isStatic; the item operations serve both.
 struct GrdItem {
     GrdText name;

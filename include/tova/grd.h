@@ -376,6 +376,92 @@ TOVA_API int32_t TOVA_CALL grdGetNeqCalendarAxis(HeaderHandle header, int32_t* u
  * axis. */
 TOVA_API int32_t TOVA_CALL _grdGetTimeAxisSpan(HeaderHandle header, FileHandle file, double* span);
 
+/* ---- File lifecycle --------------------------------------------------------
+ * A data file holds the header stream, then the static items, then the
+ * dynamic time-step data. Opening yields a header and a file handle; every
+ * later call takes both. Bad names are refused with a status and never
+ * reported (create 2002, read 2003, delete 1000). */
+TOVA_API int32_t TOVA_CALL grdFileCreate(const char* name, HeaderHandle header, FileHandle* file);
+/* readable non-zero: the file may also be read back while it is written. */
+TOVA_API int32_t TOVA_CALL grdFileCreateEx(const char* name, HeaderHandle header, FileHandle* file,
+                                           int32_t readable);
+TOVA_API int32_t TOVA_CALL grdFileRead(const char* name, HeaderHandle* header, FileHandle* file);
+TOVA_API int32_t TOVA_CALL grdFileEdit(const char* name, HeaderHandle* header, FileHandle* file);
+TOVA_API int32_t TOVA_CALL grdFileAppend(const char* name, HeaderHandle* header, FileHandle* file);
+TOVA_API int32_t TOVA_CALL grdFileFlush(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdFileFlushTimeStep(HeaderHandle header, FileHandle file);
+/* Rewrites the header of a writable file, then closes it and nulls *file.
+ * When the final header update fails the file stays open (retry possible). */
+TOVA_API int32_t TOVA_CALL grdFileClose(HeaderHandle header, FileHandle* file);
+TOVA_API int32_t TOVA_CALL grdFileDelete(const char* name);
+
+/* ---- Static items ------------------------------------------------------------
+ * A static item is an item that carries its own values; it is usable
+ * wherever an ItemHandle is taken (info and axis setters and getters). */
+TOVA_API int32_t TOVA_CALL grdStaticCreate(ItemHandle* staticItem);
+TOVA_API int32_t TOVA_CALL grdStaticDestroy(ItemHandle* staticItem);
+TOVA_API int32_t TOVA_CALL grdStaticSetHeader(HeaderHandle header, ItemHandle staticItem);
+TOVA_API int32_t TOVA_CALL grdStaticWrite(ItemHandle staticItem, FileHandle file, const void* values);
+/* The next static item of the file (destroy it with grdStaticDestroy), or
+ * null at the end of the static section (status 0) or on failure. */
+TOVA_API ItemHandle TOVA_CALL grdStaticRead(FileHandle file, int32_t* status);
+TOVA_API int32_t TOVA_CALL grdStaticGetData(ItemHandle staticItem, void* buffer);
+TOVA_API int32_t TOVA_CALL grdStaticSkip(FileHandle file);
+
+/* ---- Dynamic time-step data --------------------------------------------------
+ * Calls never name an item or a time step: the header's cursor (next item,
+ * time steps done) decides, and every write, read or skip advances it. */
+TOVA_API int32_t TOVA_CALL grdWriteStartBlockDynamic(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdWriteItemTimeStep(HeaderHandle header, FileHandle file, double time,
+                                                const void* data);
+/* data may be null: the item's values are skipped. */
+TOVA_API int32_t TOVA_CALL grdReadItemTimeStep(HeaderHandle header, FileHandle file, double* time, void* data);
+TOVA_API int32_t TOVA_CALL grdSkipItem(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdSkipTimeStep(HeaderHandle header, FileHandle file);
+/* Rounds the used elements of item itemNo in place to digits significant
+ * decimal digits; delete values and zeros stay. Always 0. */
+TOVA_API int32_t TOVA_CALL grdTruncateItemTimeStep(HeaderHandle header, int32_t itemNo, int32_t digits, void* data);
+
+/* Placeholders for time-varying and free-item data: they do nothing and
+ * return 1. */
+TOVA_API int32_t TOVA_CALL grdWriteItemTvarTimeStep(HeaderHandle header, FileHandle file, double time,
+                                                    const void* coordinates, const void* data);
+TOVA_API int32_t TOVA_CALL grdReadItemTvarTimeStep(HeaderHandle header, FileHandle file, double* time,
+                                                   void* coordinates, void* data);
+TOVA_API int32_t TOVA_CALL grdQueryFreeItemTimeStep(HeaderHandle header, FileHandle file, int32_t* itemNo,
+                                                    int32_t* elements);
+TOVA_API int32_t TOVA_CALL grdQueryFreeItemTvarTimeStep(HeaderHandle header, FileHandle file, int32_t* itemNo,
+                                                        int32_t* elements);
+TOVA_API int32_t TOVA_CALL grdReadFreeItemTimeStep(HeaderHandle header, FileHandle file, double* time,
+                                                   int32_t* itemNo, void* data);
+TOVA_API int32_t TOVA_CALL grdReadFreeItemTvarTimeStep(HeaderHandle header, FileHandle file, double* time,
+                                                       int32_t* itemNo, void* coordinates, void* data);
+TOVA_API int32_t TOVA_CALL grdWriteFreeItemTimeStep(HeaderHandle header, FileHandle file, double time,
+                                                    int32_t itemNo, int32_t elements, const void* data);
+TOVA_API int32_t TOVA_CALL grdWriteFreeItemTvarTimeStep(HeaderHandle header, FileHandle file, double time,
+                                                        int32_t itemNo, int32_t elements, const void* coordinates,
+                                                        const void* data);
+
+/* ---- Positioning ----------------------------------------------------------------
+ * 1001 (time step out of range) and 1002 (no such item or static item) are
+ * returned without calling any handler. */
+TOVA_API int32_t TOVA_CALL grdFindBlock(FileHandle file, int32_t blockCode);
+TOVA_API int32_t TOVA_CALL grdFindBlockStatic(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdFindBlockDynamic(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdFindItemStatic(HeaderHandle header, FileHandle file, int32_t staticItemNo);
+TOVA_API int32_t TOVA_CALL grdFindTimeStep(HeaderHandle header, FileHandle file, int32_t timeStep);
+TOVA_API int32_t TOVA_CALL grdFindItemDynamic(HeaderHandle header, FileHandle file, int32_t timeStep,
+                                              int32_t itemNo);
+
+/* ---- Statistics ------------------------------------------------------------------ */
+/* Per-element statistics (statistics types 2 and 3); element is 0-based.
+ * Every out pointer is optional. */
+TOVA_API int32_t TOVA_CALL grdGetItemStats(HeaderHandle header, int32_t itemNo, int32_t element, double* minimum,
+                                           double* maximum, double* mean, double* stdDev, double* autoCorrelation,
+                                           int32_t* values, int32_t* deletes, int32_t* pairs);
+TOVA_API int32_t TOVA_CALL grdGetItemStatsGlobal(ItemHandle item, double* minimum, double* maximum,
+                                                 int32_t* deletes);
+
 TOVA_EXTERN_C_END
 
 #endif /* TOVA_GRD_H */

@@ -323,6 +323,23 @@ int32_t flushFile(HeaderHandle header, FileHandle file, Update update) {
     return status;
 }
 
+// A file that holds nothing after its header gets the start block of an
+// (empty) static section before it is closed: a header is read up to the
+// block that follows it, so a header alone could not be read back. Only at
+// the end of the file: what follows the header is never written over.
+int32_t markEndOfHeader(HeaderHandle header, FileHandle file) {
+    if (file->ownerMark != kSectionHeader || file->error != F_NO_ERROR) return F_NO_ERROR;
+    const int64_t at = rcfTell64(file);
+    rcfSeek64(file, 0, 0, 2);
+    if (rcfTell64(file) != at) {
+        rcfSeek64(file, static_cast<uint32_t>(at), static_cast<uint32_t>(static_cast<uint64_t>(at) >> 32), 0);
+        return F_NO_ERROR;
+    }
+    const int32_t status = grdCheckWriteLB(header, kTagStaticStart, nullptr, file, kModule, __LINE__);
+    if (status == F_NO_ERROR) file->ownerMark = kSectionStatic;
+    return status;
+}
+
 int32_t closeFile(HeaderHandle header, FileHandle* file) {
     // A file of the legacy translator would be closed by it here; none ships.
     const FileHandle handle = file != nullptr ? *file : nullptr;
@@ -330,7 +347,8 @@ int32_t closeFile(HeaderHandle header, FileHandle* file) {
     if (status != F_NO_ERROR) return status;
     int32_t pending = F_NO_ERROR;
     if (handle->readOnly == 0) {
-        status = grdUpdateHeader(header, 1, handle);
+        status = markEndOfHeader(header, handle);
+        if (status == F_NO_ERROR) status = grdUpdateHeader(header, 1, handle);
         TdProject_AddFile(handle->filname);
         if (status != F_NO_ERROR) return status;  // the file stays open: the caller may retry
         // A write that failed earlier (and was reported then) still marks the

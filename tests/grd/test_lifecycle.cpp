@@ -256,7 +256,8 @@ TEST_F(LifecycleTest, AppendStandsAtTheEndWithTheTimeStepCount) {
 }
 
 // A file without dynamic data is appended to in the section it ends in: the
-// first time step written then begins the dynamic section itself.
+// first time step written then begins the dynamic section itself. A file
+// closed with nothing after its header was given an empty static section.
 TEST_F(LifecycleTest, AppendContinuesTheSectionTheFileEndsIn) {
     makeFileHeader();
     const std::string bare = dir_.file("bare.grd");
@@ -272,8 +273,9 @@ TEST_F(LifecycleTest, AppendContinuesTheSectionTheFileEndsIn) {
 
     if (header_ != nullptr) grdHeaderDestroy(&header_);
     ASSERT_EQ(grdFileAppend(bare.c_str(), &header_, &file_), 0);
-    EXPECT_EQ(file_->ownerMark, 1u);
+    EXPECT_EQ(file_->ownerMark, 2u);
     close();
+    EXPECT_EQ(staticNames(bare), std::vector<std::string>{});
 
     if (header_ != nullptr) grdHeaderDestroy(&header_);
     ASSERT_EQ(grdFileAppend(statics.c_str(), &header_, &file_), 0);
@@ -293,6 +295,11 @@ TEST_F(LifecycleTest, FlushThrottle) {
     ASSERT_EQ(grdSetFileTitle(header_, "aaaa"), 0);
     const std::string path = dir_.file("flush.grd");
     create(path);
+    StaticItem item;  // a header alone cannot be read back: give it something to end at
+    describeScalar(item.get(), "s");
+    const float one = 1.0f;
+    ASSERT_EQ(grdStaticWrite(item.get(), file_, &one), 0);
+    ASSERT_EQ(std::fflush(file_->stream), 0);
 
     header_->timeStepsDone = 2;  // no force: created just now, so nothing is rewritten
     EXPECT_EQ(grdFileFlushTimeStep(header_, file_), 0);

@@ -74,7 +74,7 @@ TEST_F(StaticTest, ItemsComeBackInOrderWithInfoAxesAndValues) {
     EXPECT_EQ(file_->ownerMark, 1u);
 
     const std::vector<float> grid = {1.5f, 2.5f, -3.0f, 4.0f, 5.0f, 6.25f};  // 3 x 2
-    const std::vector<double> coords = {0.0, 1.0, 3.0, 7.0};                // NeqD1 of 3: 4 boundaries
+    const std::vector<double> xs = {0.0, 1.0, 3.0, 7.0}, ys = {-1.0, 1.0};  // NeqD2 of 3 x 1: boundaries
     const std::vector<double> line = {10.0, 20.0, 30.0};
     const int32_t scalar[1] = {42};
     {
@@ -82,7 +82,7 @@ TEST_F(StaticTest, ItemsComeBackInOrderWithInfoAxesAndValues) {
         describe(header_, a.get(), "grid", QTY_ITEM_UNDEFINED, 0, RCF_FLOAT,
                  [](ItemHandle i) { return grdSetItemAxisEqD2(i, 0, 3, 2, 0.5f, 1.5f, 10.0f, 20.0f); });
         describe(header_, b.get(), "line", QTY_ITEM_UNDEFINED, 0, RCF_DOUBLE,
-                 [&](ItemHandle i) { return grdSetItemAxisNeqD1(i, 0, 3, coords.data(), 0); });
+                 [&](ItemHandle i) { return grdSetItemAxisNeqD2(i, 0, 3, 1, xs.data(), ys.data(), 0); });
         describe(header_, c.get(), "scalar", QTY_ITEM_UNDEFINED, 0, RCF_INT4, [](ItemHandle) { return 0; });
         EXPECT_EQ(grdSetItemValueType(a.get(), 7), 0);
         EXPECT_EQ(grdStaticWrite(a.get(), file_, grid.data()), 0);
@@ -120,11 +120,12 @@ TEST_F(StaticTest, ItemsComeBackInOrderWithInfoAxesAndValues) {
 
     StaticItem b(grdStaticRead(file_, &status));
     ASSERT_TRUE(b);
-    int32_t n = 0;
-    const double* coordsBack = nullptr;
-    ASSERT_EQ(grdGetItemAxisNeqD1(b.get(), nullptr, nullptr, &n, &coordsBack), 0);
-    ASSERT_EQ(n, 3);
-    EXPECT_EQ(std::vector<double>(coordsBack, coordsBack + 4), coords);
+    const double *xBack = nullptr, *yBack = nullptr;
+    ASSERT_EQ(grdGetItemAxisNeqD2(b.get(), nullptr, nullptr, &nx, &ny, &xBack, &yBack), 0);
+    ASSERT_EQ(nx, 3);
+    ASSERT_EQ(ny, 1);
+    EXPECT_EQ(std::vector<double>(xBack, xBack + 4), xs);
+    EXPECT_EQ(std::vector<double>(yBack, yBack + 2), ys);
     std::vector<double> lineBack(3);
     EXPECT_EQ(grdStaticGetData(b.get(), lineBack.data()), 0);
     EXPECT_EQ(lineBack, line);

@@ -3,11 +3,13 @@
 // conversion on write (on a private copy) and on read.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <cstring>
 #include <filesystem>
 #include <vector>
 
+#include "common/testutil.h"
 #include "test_lifecycle_support.h"
 
 using namespace grdtest;
@@ -211,6 +213,56 @@ TEST_F(StaticTest, StaticItemsCannotFollowDynamicData) {
     EXPECT_EQ(grdStaticSkip(file_), 0);
     EXPECT_EQ(rcfTell64(file_), at);
     EXPECT_EQ(file_->ownerMark, 3u);
+}
+
+// A value block that does not match its item record is refused before
+// anything is allocated for it, and nothing leaks.
+TEST_F(StaticTest, MismatchedValueBlocksAreRefused) {
+    makeFileHeader();
+    const std::string path = dir_.file("hostile.grd");
+    create(path);
+    StaticItem item;
+    describe(header_, item.get(), "four", QTY_ITEM_UNDEFINED, 0, RCF_FLOAT,
+             [](ItemHandle i) { return grdSetItemAxisEqD1(i, 0, 4, 0.0f, 1.0f); });
+    const float values[4] = {1, 2, 3, 4};
+    ASSERT_EQ(grdStaticWrite(item.get(), file_, values), 0);
+    close();
+    const std::vector<uint8_t> good = testutil::readBytes(path);
+    // The 40001 block: 0xFE, the tag, then the value record (type, count, values), 0xFF.
+    const uint8_t mark[3] = {0xFE, kTagStaticData & 0xFF, kTagStaticData >> 8};
+    size_t at = 0;
+    for (size_t i = 0; i + 3 <= good.size(); ++i)
+        if (std::memcmp(&good[i], mark, 3) == 0) at = i;
+    ASSERT_GT(at, 0u);
+    ASSERT_EQ(good[at + 3], RCF_FLOAT);
+
+    struct Case {
+        size_t offset;
+        std::vector<uint8_t> patch;
+        int32_t code;
+    } cases[] = {
+        {at + 4, {0xFF, 0xFF, 0xFF, 0x7F}, 2013},  // a count far beyond the item's 4 elements
+        {at + 4, {3, 0, 0, 0}, 2013},              // one too few
+        {at + 3, {RCF_INT4}, 2009},                // another type
+        {at + 1, {0x42}, 2019},                    // not a value block
+    };
+    for (const Case& c : cases) {
+        std::vector<uint8_t> bytes = good;
+        std::copy(c.patch.begin(), c.patch.end(), bytes.begin() + static_cast<std::ptrdiff_t>(c.offset));
+        testutil::writeBytes(path, bytes);
+        openRead(path);
+        int32_t status = 0;
+        EXPECT_EQ(grdStaticRead(file_, &status), nullptr);
+        EXPECT_EQ(status, c.code);
+        close();
+    }
+    // Cut inside the values.
+    testutil::writeBytes(path, std::vector<uint8_t>(good.begin(), good.begin() + static_cast<std::ptrdiff_t>(at + 12)));
+    openRead(path);
+    int32_t status = 0;
+    EXPECT_EQ(grdStaticRead(file_, &status), nullptr);
+    EXPECT_NE(status, 0);
+    close();
 }
 
 // Unit conversion: values given in feet are stored in metres (mode 2), from

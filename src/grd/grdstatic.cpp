@@ -38,6 +38,16 @@ double deleteDoubleOf(const GrdStaticItem* item) noexcept {
 
 // ---- Unit conversion of item data ------------------------------------------
 
+enum class GrdConvert {
+    ToStored,  // caller's unit -> stored unit (before writing)
+    ToCaller   // stored unit -> caller's unit (after reading)
+};
+
+bool dataConverts(const GrdItem* item) noexcept {
+    return (item->dataType == RCF_FLOAT || item->dataType == RCF_DOUBLE) && item->itemConvMode >= 1 &&
+           item->itemConvMode <= 3;
+}
+
 // The unit library's array conversions, by element type.
 void qtyArray(int32_t from, int32_t to, float* a, int32_t n, float del) { qtyConvertItemArrayF(from, to, a, n, del); }
 void qtyArray(int32_t from, int32_t to, double* a, int32_t n, double del) { qtyConvertItemArrayD(from, to, a, n, del); }
@@ -87,6 +97,15 @@ void convertAll(const GrdItem* item, T* data, int64_t count, T del, GrdConvert d
         convertPiece(item, data + done, n, del, dir);
         done += n;
     }
+}
+
+// Converts count values of the item's data type in place by its item unit
+// conversion mode, with the delete values of its linked header (or the
+// defaults). Other data types are left alone.
+void convertData(const GrdStaticItem* item, void* data, int64_t count, GrdConvert dir) noexcept {
+    if (data == nullptr || count <= 0 || !dataConverts(item)) return;
+    if (item->dataType == RCF_FLOAT) convertAll(item, static_cast<float*>(data), count, deleteFloatOf(item), dir);
+    else convertAll(item, static_cast<double*>(data), count, deleteDoubleOf(item), dir);
 }
 
 // ---- Reading -------------------------------------------------------------------
@@ -215,12 +234,11 @@ int32_t writeStatic(ItemHandle handle, FileHandle file, const void* values) {
     // Unit conversion on a private copy: the caller's array is never changed.
     const void* data = values;
     GrdArray<unsigned char> copy;
-    if (elements > 0 && grdItemDataConverts(item)) {
+    if (elements > 0 && dataConverts(item)) {
         copy = grdAllocArray<unsigned char>(elements * width);
         if (!copy) return fail(F_ERR_MEMORY, __LINE__);
         std::memcpy(copy.get(), values, static_cast<size_t>(elements * width));
-        grdConvertItemData(item, copy.get(), elements, deleteFloatOf(item), deleteDoubleOf(item),
-                           GrdConvert::ToStored);
+        convertData(item, copy.get(), elements, GrdConvert::ToStored);
         data = copy.get();
     }
 
@@ -246,21 +264,7 @@ int32_t writeStatic(ItemHandle handle, FileHandle file, const void* values) {
 
 }  // namespace
 
-// ---- Shared helpers ------------------------------------------------------------------
-
 GrdStaticItem* grdAsStatic(ItemHandle item) noexcept { return dynamic_cast<GrdStaticItem*>(item); }
-
-bool grdItemDataConverts(const GrdItem* item) noexcept {
-    return (item->dataType == RCF_FLOAT || item->dataType == RCF_DOUBLE) && item->itemConvMode >= 1 &&
-           item->itemConvMode <= 3;
-}
-
-void grdConvertItemData(const GrdItem* item, void* data, int64_t count, float deleteFloat, double deleteDouble,
-                        GrdConvert direction) noexcept {
-    if (item == nullptr || data == nullptr || count <= 0 || !grdItemDataConverts(item)) return;
-    if (item->dataType == RCF_FLOAT) convertAll(item, static_cast<float*>(data), count, deleteFloat, direction);
-    else convertAll(item, static_cast<double*>(data), count, deleteDouble, direction);
-}
 
 // ---- Exported interface ----------------------------------------------------------------
 
@@ -335,9 +339,7 @@ int32_t TOVA_CALL grdStaticGetData(ItemHandle staticItem, void* buffer) {
     const int64_t elements = std::max<int64_t>(grdItemUsedElementCount(item), 0);
     const int64_t bytes = width == 0 || elements > item->valueBytes / width ? item->valueBytes : elements * width;
     if (bytes > 0) std::memcpy(buffer, item->values.get(), static_cast<size_t>(bytes));
-    if (width > 0)
-        grdConvertItemData(item, buffer, bytes / width, deleteFloatOf(item), deleteDoubleOf(item),
-                           GrdConvert::ToCaller);
+    if (width > 0) convertData(item, buffer, bytes / width, GrdConvert::ToCaller);
     return trace.done(F_NO_ERROR);
 }
 

@@ -1,7 +1,6 @@
 // Gridded data-file layer, static items: an item that carries its own value
 // array, written after the header (block 40000 once, then per item its item
-// record and one 40001 block of values) and read back in file order. Also
-// the unit conversion of item data shared with the time-step code.
+// record and one 40001 block of values) and read back in file order.
 //
 // Section state of a data file (RcfFile::ownerMark): 1 positioned after the
 // header, 2 inside the static items, 3 inside the dynamic data.
@@ -27,19 +26,3 @@ struct GrdStaticItem : GrdItem {
 // The static item behind an item handle, or null for a null handle or an
 // item of a header.
 GrdStaticItem* grdAsStatic(ItemHandle item) noexcept;
-
-// Direction of a data conversion by an item's unit-conversion mode.
-enum class GrdConvert {
-    ToStored,  // caller's unit -> stored unit (before writing)
-    ToCaller   // stored unit -> caller's unit (after reading)
-};
-
-// Converts count values of the item's data type in place by its item unit
-// conversion mode (1 user unit, 2 alternative unit, 3 first unit of the item
-// type's sequence; other modes nothing). Float data use deleteFloat, double
-// data deleteDouble; other data types are left alone. Counts beyond int32
-// are converted in pieces.
-void grdConvertItemData(const GrdItem* item, void* data, int64_t count, float deleteFloat, double deleteDouble,
-                        GrdConvert direction) noexcept;
-// Whether grdConvertItemData would change anything for this item.
-bool grdItemDataConverts(const GrdItem* item) noexcept;

@@ -8,6 +8,7 @@
 #include <cstring>
 #include <iterator>
 #include <mutex>
+#include <new>
 #include <unordered_map>
 #include <unordered_set>
 #include <utility>
@@ -256,7 +257,14 @@ int32_t xsecTableLoad(const char* path, XsecTable** out, uint32_t flags) {
         switch (tag) {
             case kXfsKeyBlock: pendingKey = std::move(block); break;
             case kXfsHeaderBlock: {
-                auto sec = std::make_unique<CTDxSec>(pendingKey.get(), block.get(), version);
+                // A cross section that cannot be made, like an invalid one,
+                // ends the load.
+                std::unique_ptr<CTDxSec> sec;
+                try {
+                    sec = std::make_unique<CTDxSec>(pendingKey.get(), block.get(), version);
+                } catch (const std::bad_alloc&) {
+                    return F_ERR_VALUE;
+                }
                 pendingKey.reset();
                 sec->afterRead();
                 if (!sec->validFlag) return F_ERR_VALUE;
@@ -341,11 +349,15 @@ int32_t TOVA_CALL xfsXsecTableLoad(const char* path, XsecTableHandle* out, uint3
 
 void TOVA_CALL xfsXsecTableFree(XsecTableHandle* table) {
     if (table == nullptr) return;
-    XsecTable* t = xsecTableResolve(*table);
-    *table = nullptr;
-    if (t == nullptr) return;
-    xsecTableUnregister(t);
-    delete t;
+    tova::guarded([&] {
+        XsecTable* t = xsecTableResolve(*table);
+        *table = nullptr;
+        if (t != nullptr) {
+            xsecTableUnregister(t);
+            delete t;
+        }
+        return 0;
+    });
 }
 
 int32_t TOVA_CALL xfsXsecTableVersion(XsecTableHandle /*table*/) { return xsecTableVersion(); }
@@ -361,11 +373,14 @@ XsecHandle TOVA_CALL xfsXsecCreateEx(const char* primaryName, double keyValue, c
 
 void TOVA_CALL xfsXsecFree(XsecHandle* xsec) {
     if (xsec == nullptr) return;
-    CTDxSec* sec = xsecResolve(*xsec);
-    // A cross section of a loaded table goes with its table.
-    if (sec != nullptr && sec->table != nullptr) return;
-    *xsec = nullptr;
-    delete sec;
+    tova::guarded([&] {
+        CTDxSec* sec = xsecResolve(*xsec);
+        // A cross section of a loaded table goes with its table.
+        if (sec != nullptr && sec->table != nullptr) return 0;
+        *xsec = nullptr;
+        delete sec;
+        return 0;
+    });
 }
 
 int32_t TOVA_CALL xfsXsecSetNoCoords(XsecHandle xsec, uint32_t count) {

@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <cstdio>
+#include <memory>
 
 #include "tova/rcf.h"
 
@@ -40,9 +41,28 @@ struct RcfFile {
     uint32_t peekLen[4] = {};
     uint32_t peekHdr[4] = {};
     unsigned char scratch[4096] = {};
+
+    // Beyond the on-disk model: the stream's buffer (installed with setvbuf,
+    // freed only after the stream is closed) and the largest file length
+    // seen so far, refreshed on demand to bound what a record may claim.
+    std::unique_ptr<char[]> ioBuffer;
+    int64_t knownSize = 0;
+
+    RcfFile() = default;
+    RcfFile(const RcfFile&) = delete;
+    RcfFile& operator=(const RcfFile&) = delete;
+    // Closes a stream still open and frees the owned texts.
+    ~RcfFile();
 };
 
 constexpr uint32_t kRcfVersionCurrent = 104;
+constexpr size_t kRcfStreamBufferSize = 256 * 1024;
+
+// Handler form of this layer's own table (slots for 1000 and 2000-2019).
+using rcfErrorHandler = int32_t (*)(int32_t code, const char* module, int32_t line);
+// Stores handler for code and returns the previous one; codes without a slot
+// store nothing and return null. No part of the library installs handlers.
+rcfErrorHandler rcfSetErrorHandler(int32_t code, rcfErrorHandler handler);
 
 // Opens and creation, used by the file-open, cross-section and VRE code.
 int32_t rcfFileOpenCreate(const char* path, const char* appText, FileHandle* out, rcfAppIdent appIdent,
@@ -64,9 +84,14 @@ void rcfUnpeekHeader(FileHandle h);
 void rcfSkipBytes(FileHandle h, int32_t n);
 void rcfSeek(FileHandle h, int32_t offset, int32_t origin);
 void rcfSkipDeferred(FileHandle h, uint32_t n);
+// As rcfSkipDeferred for a distance of any size (a move that does not fit the
+// pending counter is applied at once).
+void rcfSkipDeferred64(FileHandle h, uint64_t n);
 uint32_t rcfRecordBytes(int32_t type, uint32_t count);
 
-// In-memory record lists and whole logical blocks.
+// In-memory record lists and whole logical blocks. Node data is allocated
+// with malloc: a buffer taken with rcfLrecDetachData is freed with
+// rcfLrecFree (or free).
 struct LrecNode {
     int32_t type;
     uint32_t count;

@@ -14,6 +14,7 @@ decl = re.compile(r"\b(?:TOVA_API|QTY_API)\b[^;{(]*?\b([A-Za-z_]\w*)\s*\(", re.S
 for header in include.rglob("*.h"):
     text = re.sub(r"/\*.*?\*/", "", header.read_text(), flags=re.S)
     text = re.sub(r"//[^\n]*", "", text)
+    text = re.sub(r"^[ \t]*#.*$", "", text, flags=re.M)  # the export macros' own definitions
     for m in decl.finditer(text):
         marked.add(m.group(1))
 

@@ -109,7 +109,7 @@ TEST(XfsFile, CrossSectionsRoundTripWithEveryDataSet) {
         XsecHandle loaded = xfsXsecFind(t.h, x->primaryName, x->keyValue, x->secondaryName, &cursor);
         expectSameRecord(x, loaded);
         if (loaded != nullptr) {
-            EXPECT_EQ(loaded->owner, static_cast<void*>(xsecResolve(loaded)));
+            EXPECT_EQ(get(loaded->owner), static_cast<void*>(xsecResolve(loaded)));
         }
     }
     // The header block of the first cross section follows its key block of
@@ -250,9 +250,9 @@ TEST(XfsFile, KeysOnlyLoadDropsEveryDataSet) {
     ASSERT_EQ(t.status, 0);
     int seen = 0;
     for (XsecHandle x = xfsXsecFind(t.h, "", 0.0, "", nullptr); x != nullptr; x = xfsXsecNext(t.h, x), ++seen) {
-        EXPECT_EQ(x->noRaw + x->noSel + x->noPrc + x->noCoords, 0u);
-        EXPECT_EQ(x->raw[0], nullptr);
-        EXPECT_EQ(x->sel, nullptr);
+        EXPECT_EQ(get(x->noRaw) + get(x->noSel) + get(x->noPrc) + get(x->noCoords), 0u);
+        EXPECT_EQ(get(x->raw[0]), nullptr);
+        EXPECT_EQ(get(x->sel), nullptr);
     }
     EXPECT_EQ(seen, 2);
 }
@@ -276,10 +276,10 @@ TEST(XfsFile, OlderLayoutsLoadWithTheirHeaderSizesAndThreeColumnRawBlocks) {
     EXPECT_STREQ(x->extraName, " ");
     EXPECT_EQ(x->headerWords[23], 723);
     EXPECT_EQ(x->headerWords[24], 0);
-    EXPECT_EQ(x->headerValues[14], 64.0);
-    EXPECT_EQ(x->headerValues[15], 0.001);
-    EXPECT_EQ(x->headerValues[22], 1.0);
-    ASSERT_EQ(x->noRaw, 2u);
+    EXPECT_EQ(get(x->headerValues[14]), 64.0);
+    EXPECT_EQ(get(x->headerValues[15]), 0.001);
+    EXPECT_EQ(get(x->headerValues[22]), 1.0);
+    ASSERT_EQ(get(x->noRaw), 2u);
     EXPECT_EQ(x->raw[2][1], 6.0);
     EXPECT_EQ(x->raw3[1], 0.0);
     EXPECT_EQ(x->rawMark[1][1], 0);
@@ -302,12 +302,12 @@ TEST(XfsFile, OlderLayoutsLoadWithTheirHeaderSizesAndThreeColumnRawBlocks) {
     EXPECT_STREQ(four->extraName, "extra");
     EXPECT_EQ(four->headerWords[19], 719);
     EXPECT_EQ(four->headerWords[20], 0);
-    EXPECT_EQ(four->headerValues[9], 59.0);
-    EXPECT_EQ(four->headerValues[10], 1.0);
+    EXPECT_EQ(get(four->headerValues[9]), 59.0);
+    EXPECT_EQ(get(four->headerValues[10]), 1.0);
     EXPECT_EQ(three->headerWords[15], 715);
     EXPECT_EQ(three->headerWords[16], 0);
-    EXPECT_EQ(three->headerValues[8], 58.0);
-    EXPECT_EQ(three->headerValues[9], 0.0);
+    EXPECT_EQ(get(three->headerValues[8]), 58.0);
+    EXPECT_EQ(get(three->headerValues[9]), 0.0);
     EXPECT_EQ(three->headerWords[23], 2);
 }
 
@@ -338,7 +338,7 @@ TEST(XfsFile, AMalformedDataBlockInvalidatesOnlyItsCrossSection) {
     XsecCursor cursor = nullptr;
     XsecHandle x1 = xfsXsecFind(t.h, "", 0.0, "", &cursor);
     ASSERT_NE(x1, nullptr);
-    EXPECT_EQ(x1->noSel, 2u);
+    EXPECT_EQ(get(x1->noSel), 2u);
     EXPECT_EQ(keyOf(x1), "x1/s/1.000000/ ");
     // The walk meets the two invalid cross sections as nulls.
     EXPECT_EQ(drain(t.h, cursor), keys({"null", "null", "x4/s/1.000000/ "}));
@@ -416,7 +416,7 @@ TEST(XfsFile, MisusedHandlesAreAnsweredQuietly) {
         EXPECT_EQ(copy, nullptr);
     }
     xfsXsecFree(nullptr);
-    EXPECT_EQ(foreignRecord.noRaw, 0u);
+    EXPECT_EQ(get(foreignRecord.noRaw), 0u);
 
     // A record whose owner reference was cleared resolves to nothing either.
     XsecHandle x = owned.all[0];
@@ -505,7 +505,7 @@ TEST(XfsFile, WriteStopsAtAFileErrorAndRefusesABrokenRecord) {
     ASSERT_EQ(t.status, 0);
     XsecHandle loaded = xfsXsecFind(t.h, "a", 1, "b", nullptr);
     ASSERT_NE(loaded, nullptr);
-    EXPECT_EQ(loaded->noRaw, x->noRaw);
+    EXPECT_EQ(get(loaded->noRaw), get(x->noRaw));
     EXPECT_EQ(loaded->raw[1][2], x->raw[1][2]);
     EXPECT_EQ(loaded->raw3[2], 0.0);
     EXPECT_EQ(loaded->rawMark[0][2], x->rawMark[0][2]);
@@ -543,9 +543,9 @@ TEST(XfsFile, TruncatedAndCorruptedFilesNeverCrashTheLoader) {
         }
     }
     for (size_t at = 0; at < good.size(); ++at) {
-        for (uint8_t pattern : {0x00, 0x7F, 0xFF}) {
+        for (uint8_t pattern : {0x7F, 0xFF}) {
             auto bytes = good;
-            bytes[at] = pattern;
+            bytes[at] ^= pattern;
             loadAndWalk(bytes);
         }
     }

@@ -39,7 +39,7 @@ void expectDefaultHeader(const XsecData* x, int fromWord, int fromValue) {
     for (int i = fromWord; i < 25; ++i) EXPECT_EQ(x->headerWords[i], i == 23 ? 2 : 0) << "word " << i;
     for (int i = fromValue; i < 23; ++i) {
         const double expected = i < 10 ? 0.0 : i == 15 ? 0.001 : 1.0;
-        EXPECT_EQ(x->headerValues[i], expected) << "value " << i;
+        EXPECT_EQ(get(x->headerValues[i]), expected) << "value " << i;
     }
 }
 
@@ -51,10 +51,10 @@ TEST(XsecObject, NewCrossSectionHasItsNamesAndDefaults) {
     EXPECT_STREQ(plain->primaryName, "River");
     EXPECT_STREQ(plain->secondaryName, "Reach");
     EXPECT_STREQ(plain->extraName, " ");
-    EXPECT_EQ(plain->keyValue, 12.5);
-    EXPECT_EQ(plain->owner, static_cast<void*>(xsecResolve(plain)));
-    EXPECT_EQ(plain->noRaw + plain->noSel + plain->noPrc + plain->noCoords, 0u);
-    EXPECT_EQ(plain->raw[0], nullptr);
+    EXPECT_EQ(get(plain->keyValue), 12.5);
+    EXPECT_EQ(get(plain->owner), static_cast<void*>(xsecResolve(plain)));
+    EXPECT_EQ(get(plain->noRaw) + get(plain->noSel) + get(plain->noPrc) + get(plain->noCoords), 0u);
+    EXPECT_EQ(get(plain->raw[0]), nullptr);
     expectDefaultHeader(plain, 0, 0);
 
     EXPECT_STREQ(owned.add("a", 0, "b", "")->extraName, " ");
@@ -102,27 +102,27 @@ TEST(XsecObject, SetCountsAllocateZeroedArraysAndZeroFreesTheSet) {
     ASSERT_EQ(xfsXsecSetNoSel(x, 2), 1);
     ASSERT_EQ(xfsXsecSetNoPrc(x, 3), 1);
     ASSERT_EQ(xfsXsecSetNoCoords(x, 5), 1);
-    EXPECT_EQ(x->noRaw, 4u);
-    EXPECT_EQ(x->noSel, 2u);
-    EXPECT_EQ(x->noPrc, 3u);
-    EXPECT_EQ(x->noCoords, 5u);
+    EXPECT_EQ(get(x->noRaw), 4u);
+    EXPECT_EQ(get(x->noSel), 2u);
+    EXPECT_EQ(get(x->noPrc), 3u);
+    EXPECT_EQ(get(x->noCoords), 5u);
     for (uint32_t i = 0; i < 4; ++i)
         EXPECT_EQ(x->raw[0][i] + x->raw[1][i] + x->raw[2][i] + x->raw3[i] + x->rawMark[0][i] + x->rawMark[1][i], 0);
-    for (int c = 0; c < 6; ++c) EXPECT_NE(x->prc[c], nullptr);
+    for (int c = 0; c < 6; ++c) EXPECT_NE(get(x->prc[c]), nullptr);
     EXPECT_EQ(x->coords[2][4], 0.0);
 
     // Only the low 16 bits count.
     ASSERT_EQ(xfsXsecSetNoSel(x, 0x10003u), 1);
-    EXPECT_EQ(x->noSel, 3u);
+    EXPECT_EQ(get(x->noSel), 3u);
 
     // Zero frees the set and keeps the cross section valid.
     ASSERT_EQ(xfsXsecSetNoRaw(x, 0), 1);
-    EXPECT_EQ(x->noRaw, 0u);
-    EXPECT_EQ(x->raw[0], nullptr);
-    EXPECT_EQ(x->raw3, nullptr);
-    EXPECT_EQ(x->rawMark[1], nullptr);
+    EXPECT_EQ(get(x->noRaw), 0u);
+    EXPECT_EQ(get(x->raw[0]), nullptr);
+    EXPECT_EQ(get(x->raw3), nullptr);
+    EXPECT_EQ(get(x->rawMark[1]), nullptr);
     ASSERT_EQ(xfsXsecSetNoCoords(x, 0x10000u), 1);
-    EXPECT_EQ(x->coords[0], nullptr);
+    EXPECT_EQ(get(x->coords[0]), nullptr);
     EXPECT_EQ(xfsXsecSetNoPrc(x, 2), 1);
 }
 
@@ -135,7 +135,7 @@ TEST(XsecObject, DataBlocksAreTakenWhole) {
         // The buffers were taken over, not copied.
         EXPECT_EQ(raw.head->data, nullptr);
     }
-    EXPECT_EQ(sec.rec.noRaw, 3u);
+    EXPECT_EQ(get(sec.rec.noRaw), 3u);
     EXPECT_EQ(sec.rec.raw[2][1], 21.0);
     EXPECT_EQ(sec.rec.raw3[2], 32.0);
     EXPECT_EQ(sec.rec.rawMark[1][2], 102);
@@ -145,7 +145,7 @@ TEST(XsecObject, DataBlocksAreTakenWhole) {
         List raw({doubles(column(2, 5)), doubles(column(2, 6)), doubles(column(2, 7))});
         ASSERT_EQ(sec.takeRecords(XsecSet::Raw, raw.head), 1u);
     }
-    EXPECT_EQ(sec.rec.noRaw, 2u);
+    EXPECT_EQ(get(sec.rec.noRaw), 2u);
     EXPECT_EQ(sec.rec.raw[0][1], 6.0);
     EXPECT_EQ(sec.rec.raw3[1], 0.0);
     EXPECT_EQ(sec.rec.rawMark[0][1], 0);
@@ -160,9 +160,9 @@ TEST(XsecObject, DataBlocksAreTakenWhole) {
         ASSERT_EQ(sec.takeRecords(XsecSet::Sel, sel.head), 1u);
         ASSERT_EQ(sec.takeRecords(XsecSet::Prc, prc.head), 1u);
     }
-    EXPECT_EQ(sec.rec.noCoords, 4u);
+    EXPECT_EQ(get(sec.rec.noCoords), 4u);
     EXPECT_EQ(sec.rec.coords[2][3], 6.0);
-    EXPECT_EQ(sec.rec.noSel, 7u);
+    EXPECT_EQ(get(sec.rec.noSel), 7u);
     EXPECT_EQ(sec.rec.sel[6], 15.0);
     EXPECT_EQ(sec.rec.prc[5][0], 5.0);
 }
@@ -183,8 +183,8 @@ TEST(XsecObject, MalformedDataBlocksMakeTheCrossSectionInvalid) {
         EXPECT_EQ(sec.takeRecords(XsecSet::Raw, block.head), 0u) << "block " << k;
         EXPECT_EQ(sec.publicRecord(), nullptr);
         // The arrays are left as they were, and the object stays invalid.
-        EXPECT_EQ(sec.rec.raw[0], before);
-        EXPECT_EQ(sec.rec.noRaw, 2u);
+        EXPECT_EQ(get(sec.rec.raw[0]), before);
+        EXPECT_EQ(get(sec.rec.noRaw), 2u);
         List good({doubles(column(1, 0))});
         EXPECT_EQ(sec.takeRecords(XsecSet::Sel, good.head), 0u);
         EXPECT_EQ(sec.setCount(XsecSet::Sel, 1), 0u);
@@ -216,9 +216,9 @@ TEST(XsecObject, HeaderLayoutFollowsVersionAndKeyShape) {
         EXPECT_STREQ(sec.rec.primaryName, "p");
         EXPECT_STREQ(sec.rec.secondaryName, "s");
         EXPECT_STREQ(sec.rec.extraName, c.fourKeys ? "extra" : " ");
-        EXPECT_EQ(sec.rec.keyValue, 2.5);
+        EXPECT_EQ(get(sec.rec.keyValue), 2.5);
         for (int i = 0; i < c.words; ++i) EXPECT_EQ(sec.rec.headerWords[i], fileWords[i]) << c.version;
-        for (int i = 0; i < c.values; ++i) EXPECT_EQ(sec.rec.headerValues[i], fileValues[i]) << c.version;
+        for (int i = 0; i < c.values; ++i) EXPECT_EQ(get(sec.rec.headerValues[i]), fileValues[i]) << c.version;
         expectDefaultHeader(&sec.rec, c.words, c.values);
     }
 
@@ -228,7 +228,7 @@ TEST(XsecObject, HeaderLayoutFollowsVersionAndKeyShape) {
     CTDxSec sec(key.head, shortHeader.head, 106);
     ASSERT_EQ(sec.validFlag, 1u);
     EXPECT_EQ(sec.rec.headerWords[1], 8);
-    EXPECT_EQ(sec.rec.headerValues[0], 3.0);
+    EXPECT_EQ(get(sec.rec.headerValues[0]), 3.0);
     expectDefaultHeader(&sec.rec, 2, 1);
 }
 
@@ -253,5 +253,5 @@ TEST(XsecObject, MalformedKeyOrHeaderBlocksGiveAnInvalidObject) {
     List wideKey({text("p"), text(std::string("\0\0\0\0\0\0\xf0?-tail", 13)), text("s")});
     CTDxSec wide(wideKey.head, header.head, 106);
     ASSERT_EQ(wide.validFlag, 1u);
-    EXPECT_EQ(wide.rec.keyValue, 1.0);
+    EXPECT_EQ(get(wide.rec.keyValue), 1.0);
 }

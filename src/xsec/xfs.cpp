@@ -162,63 +162,61 @@ XsecTable::XsecTable() : serial(nextTableSerial()) {}
 
 XsecTable::~XsecTable() {
     for (CTDxSec* sec : list) delete sec;
+    for (CTDxSec* sec : staged_) delete sec;
     if (file != nullptr) rcfFileClose(&file);
 }
 
-CTDxSec* XsecTable::insert(std::unique_ptr<CTDxSec> sec) {
+CTDxSec* XsecTable::stage(std::unique_ptr<CTDxSec> sec) {
     // Files are usually written in key order: appending is the common case,
     // and a new first element (descending files) needs no search either.
-    auto pos = list.end();
-    if (!list.empty() && !sec->compareKey(*list.back(), +1))
-        pos = list.front()->compareKey(*sec, +1) ? list.begin() : upperBound(*sec);
-    const auto node = list.insert(pos, sec.get());
-    CTDxSec* inserted = sec.release();
-    inserted->table = this;
-    inserted->node = node;
-    return inserted;
+    size_t pos = staged_.size();
+    if (!staged_.empty() && !sec->compareKey(*staged_.back(), +1))
+        pos = staged_.front()->compareKey(*sec, +1) ? 0 : upperBound(*sec);
+    staged_.insert(staged_.begin() + static_cast<ptrdiff_t>(pos), sec.get());
+    return sec.release();
 }
 
-// Bisection over the linked list: the iterator walks from its last position
-// to each middle. Equal keys stay in load order (upper bound).
-XsecList::iterator XsecTable::upperBound(const CTDxSec& sec) {
+// Bisection for the upper bound: equal keys stay in load order.
+size_t XsecTable::upperBound(const CTDxSec& sec) const {
     size_t low = 0;
-    size_t high = list.size();
-    size_t at = 0;
-    auto it = list.begin();
+    size_t high = staged_.size();
     while (low < high) {
         const size_t middle = low + (high - low) / 2;
-        std::advance(it, static_cast<ptrdiff_t>(middle) - static_cast<ptrdiff_t>(at));
-        at = middle;
-        if ((*it)->compareKey(sec, +1)) high = middle;
+        if (staged_[middle]->compareKey(sec, +1)) high = middle;
         else low = middle + 1;
     }
-    if (low == list.size()) return list.end();
-    std::advance(it, static_cast<ptrdiff_t>(low) - static_cast<ptrdiff_t>(at));
-    return it;
+    return low;
+}
+
+void XsecTable::finishLoad() {
+    byPosition.reserve(byPosition.size() + staged_.size());
+    while (!staged_.empty()) {
+        CTDxSec* sec = staged_.front();
+        // If the list cannot grow, sec stays staged and is freed with the table.
+        sec->node = list.insert(list.end(), sec);
+        sec->table = this;
+        staged_.pop_front();
+        byPosition.push_back(sec);
+    }
 }
 
 XsecList::iterator XsecTable::lowerBound(const char* primaryName, const char* secondaryName, double keyValue,
                                          bool* equal) {
     *equal = false;
-    if (list.empty()) return list.end();
+    if (byPosition.empty()) return list.end();
     auto order = [&](const CTDxSec* sec) {
         return xsecKeyOrder(sec->rec.primaryName, sec->rec.secondaryName, sec->rec.keyValue, primaryName,
                             secondaryName, keyValue);
     };
     size_t low = 0;
-    size_t high = list.size() - 1;
-    size_t at = 0;
-    auto it = list.begin();
+    size_t high = byPosition.size() - 1;
     while (low < high) {
         const size_t middle = low + (high - low) / 2;
-        std::advance(it, static_cast<ptrdiff_t>(middle) - static_cast<ptrdiff_t>(at));
-        at = middle;
-        if (order(*it) < 0) low = middle + 1;
+        if (order(byPosition[middle]) < 0) low = middle + 1;
         else high = middle;
     }
-    std::advance(it, static_cast<ptrdiff_t>(high) - static_cast<ptrdiff_t>(at));
-    *equal = order(*it) == 0;
-    return it;
+    *equal = order(byPosition[high]) == 0;
+    return byPosition[high]->node;
 }
 
 // ---- Load -------------------------------------------------------------------
@@ -269,7 +267,7 @@ int32_t xsecTableLoad(const char* path, XsecTable** out, uint32_t flags) {
                 sec->afterRead();
                 if (!sec->validFlag) return F_ERR_VALUE;
                 sec->blockPosition = static_cast<uint32_t>(position);
-                last = table->insert(std::move(sec));
+                last = table->stage(std::move(sec));
                 break;
             }
             case kXfsRawBlock:
@@ -284,6 +282,7 @@ int32_t xsecTableLoad(const char* path, XsecTable** out, uint32_t flags) {
             default: break;
         }
     }
+    table->finishLoad();
     xsecTableRegister(table.get());
     *out = table.release();
     return 0;

@@ -7,10 +7,12 @@
 #pragma once
 
 #include <cstdint>
+#include <deque>
 #include <list>
 #include <memory>
 #include <mutex>
 #include <unordered_set>
+#include <vector>
 
 #include "rcf/rcf_internal.h"
 #include "tova/xfs.h"
@@ -122,6 +124,10 @@ private:
 CTDxRefList& xsecCursors();
 
 // A loaded file: cross sections in key order and the file they came from.
+// While loading, cross sections are placed in a positional staging sequence
+// by bisection (the same probes as over the list, without walking nodes);
+// finishLoad() moves them into the list. A table does not change after
+// loading, so the positional index serves finds.
 struct XsecTable {
     XsecTable();
     ~XsecTable();
@@ -129,17 +135,21 @@ struct XsecTable {
     XsecTable& operator=(const XsecTable&) = delete;
 
     // Places sec by the key order, behind any equal keys; returns it.
-    CTDxSec* insert(std::unique_ptr<CTDxSec> sec);
+    CTDxSec* stage(std::unique_ptr<CTDxSec> sec);
+    // Moves the staged cross sections into the list and the index.
+    void finishLoad();
     // First element not ordered before the key, and whether it equals it.
     XsecList::iterator lowerBound(const char* primaryName, const char* secondaryName, double keyValue,
                                   bool* equal);
 
     XsecList list;
+    std::vector<CTDxSec*> byPosition;  // the list's elements by position
     FileHandle file = nullptr;
     const uint64_t serial;
 
 private:
-    XsecList::iterator upperBound(const CTDxSec& sec);
+    size_t upperBound(const CTDxSec& sec) const;
+    std::deque<CTDxSec*> staged_;
 };
 
 // Registries of live objects. Resolution returns null for anything that is

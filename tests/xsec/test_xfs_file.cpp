@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cstdlib>
 #include <filesystem>
+#include <random>
 #include <tuple>
 
 #include "common/testutil.h"
@@ -158,6 +159,29 @@ TEST(XfsFile, TablesAreSortedByNamesThenValueAndStableForEqualKeys) {
         for (int i = 0; i <= 9; ++i) expected.push_back("s/t/" + std::to_string(double(i)) + "/ ");
         EXPECT_EQ(walk(sorted.h), expected) << name;
     }
+}
+
+TEST(XfsFile, ARandomOrderFileLoadsAsAStableSortOfIt) {
+    testutil::TempDir dir;
+    const char* primaries[] = {"a", "A", "b", "B", "c"};
+    const char* secondaries[] = {"x", "X"};
+    std::mt19937 random(99);
+    Owned owned;
+    for (int i = 0; i < 3000; ++i) {
+        owned.add(primaries[random() % 5], static_cast<double>(random() % 10), secondaries[random() % 2],
+                  std::to_string(i).c_str());
+    }
+    writeFile(dir.file("random.xfs"), owned.all);
+    std::vector<XsecHandle> expected = owned.all;
+    std::stable_sort(expected.begin(), expected.end(), [](XsecHandle a, XsecHandle b) {
+        return xsecKeyOrder(a->primaryName, a->secondaryName, a->keyValue, b->primaryName, b->secondaryName,
+                            b->keyValue) < 0;
+    });
+    Table t(dir.file("random.xfs"));
+    ASSERT_EQ(t.status, 0);
+    std::vector<std::string> want;
+    for (XsecHandle x : expected) want.push_back(keyOf(x));
+    EXPECT_EQ(walk(t.h), want);
 }
 
 TEST(XfsFile, FindReturnsTheFirstMatchAndFindNextWalksOnWithoutComparing) {

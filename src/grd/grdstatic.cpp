@@ -242,7 +242,7 @@ int32_t writeStatic(ItemHandle handle, FileHandle file, const void* values) {
         data = copy.get();
     }
 
-    if (file->error == F_EOF) file->error = F_NO_ERROR;  // a look-ahead that met the end
+    clearEndOfFile(file);  // a look-ahead that met the end
     if (file->ownerMark < kSectionStatic) {
         status = grdCheckWriteLB(header, kTagStaticStart, nullptr, file, kModule, __LINE__);
         if (status != F_NO_ERROR) return status;

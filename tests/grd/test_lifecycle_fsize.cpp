@@ -3,6 +3,8 @@
 // cannot complete the file refuses to close it. Each case runs in a forked
 // child with RLIMIT_FSIZE set and SIGXFSZ ignored, and sends its statuses
 // back through a pipe.
+#ifndef _WIN32  // file size limits and fork are POSIX
+
 #include <gtest/gtest.h>
 
 #include <csignal>
@@ -104,3 +106,5 @@ TEST_F(WriteFailureTest, CreateThatCannotWriteItsHeaderLeavesNothing) {
 }
 
 }  // namespace
+
+#endif  // _WIN32

@@ -224,6 +224,12 @@ int32_t createFile(const char* name, HeaderHandle header, FileHandle* outFile, i
 
     FileHandle file = FOpenFileCreate(name, readable);
     if (file == nullptr) return report(header, nullptr, F_ERR_OPEN, __LINE__);
+    // A new file has no time steps yet: the cursor starts at its beginning
+    // even when the header served another file before.
+    header->nextItem = 0;
+    header->timeStepsDone = 0;
+    header->currentTime = 0.0;
+    header->largestTime = F_DELETE_VALUE_DOUBLE;
     status = grdWriteHeader(header, file);
     if (status == F_NO_ERROR && header->fileCompressed != 0) status = writeEncodingKeys(header, file);
     if (status == F_NO_ERROR) {

@@ -77,6 +77,14 @@ TEST_F(LifecycleTest, CreateCloseReadEditRoundTrip) {
     EXPECT_EQ(takeCodes(), Codes{2015});
     close();  // a file open for reading is closed without an update
 
+    // The header of one file can create another: its cursor starts afresh.
+    header_->timeStepsDone = 4;
+    header_->nextItem = 1;
+    create(dir_.file("copy.grd"));
+    EXPECT_EQ(header_->timeStepsDone, 0);
+    EXPECT_EQ(header_->nextItem, 0);
+    close();
+
     // Editing rewrites the header in place on close.
     if (header_ != nullptr) grdHeaderDestroy(&header_);
     ASSERT_EQ(grdFileEdit(path.c_str(), &header_, &file_), 0);

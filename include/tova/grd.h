@@ -12,6 +12,72 @@
 
 TOVA_EXTERN_C_BEGIN
 
+/* ---- Handles and enums ---------------------------------------------------- */
+
+/* One item of a header (numbered from 1), or the item of a static item. Lent
+ * by the header (or owned by the static item); never freed by callers. */
+typedef struct GrdItem* ItemHandle;
+/* One custom block of a header's chain; lent by the header. */
+typedef struct GrdCustomBlock* CustomBlockHandle;
+
+/* The file's time/space organisation; only these exact values are valid. */
+typedef enum {
+    F_UNDEFINED_FILE_TYPE = 0,
+    F_EQTIME_FIXEDSPACE_ALLITEMS = 1,
+    F_EQTIME_TVARSPACE_ALLITEMS = 2,
+    F_NEQTIME_FIXEDSPACE_ALLITEMS = 4,
+    F_NEQTIME_FIXEDSPACE_VARITEMS = 8,
+    F_NEQTIME_TVARSPACE_VARITEMS = 16
+} FileType;
+
+typedef enum {
+    F_UNDEFINED_TAXIS = 0,
+    F_TM_EQ_AXIS = 1,   /* equidistant time values */
+    F_TM_NEQ_AXIS = 2,  /* non-equidistant time values */
+    F_CAL_EQ_AXIS = 3,  /* equidistant calendar axis */
+    F_CAL_NEQ_AXIS = 4  /* non-equidistant calendar axis */
+} TimeAxisType;
+
+typedef enum {
+    F_UNDEFINED_AXIS = 0,
+    F_EQ_AXIS_D0 = 1,  /* a single value */
+    F_EQ_AXIS_D1 = 2,
+    F_NEQ_AXIS_D1 = 3,
+    F_TVAR_AXIS_D1 = 4,
+    F_EQ_AXIS_D2 = 5,
+    F_NEQ_AXIS_D2 = 6,
+    F_TVAR_AXIS_D2 = 7,
+    F_EQ_AXIS_D3 = 8,
+    F_NEQ_AXIS_D3 = 9,
+    F_TVAR_AXIS_D3 = 10,
+    F_EQ_AXIS_D4 = 11,
+    F_CURVE_LINEAR_AXIS_D2 = 12, /* dimension reported as -1 */
+    F_CURVE_LINEAR_AXIS_D3 = 13  /* dimension reported as -1 */
+} ItemAxisType;
+
+/* Chosen at creation: 1 item-global statistics only; 2 and 3 add a
+ * per-element statistics record to every item. */
+typedef enum {
+    F_ITEM_STATS_GLOBAL = 1,
+    F_ITEM_STATS_ELEMENT = 2,
+    F_ITEM_STATS_ELEMENT_ALT = 3
+} ItemStatsType;
+
+typedef enum {
+    F_UNDEFINED_GEOINFO = 0,
+    F_UTM_PROJECTION = 1 /* projection string plus origin and orientation */
+} GeoInfoType;
+
+/* Default delete (missing-value) markers of a new header. */
+#define F_DELETE_VALUE_FLOAT (-1e-35f)   /* bits 0x8554AD2E */
+#define F_DELETE_VALUE_DOUBLE (-1e-255)  /* bits 0x8AFE07B27DD78B14 */
+#define F_DELETE_VALUE_BYTE 0
+#define F_DELETE_VALUE_INT 2147483647
+#define F_DELETE_VALUE_UNSIGNED_INT 2147483647u
+
+/* Version of the data-file layer, also the format version of new files. */
+#define F_GRD_VERSION 206
+
 /* ---- Error handlers and tracing ------------------------------------------ */
 
 /* Stores handler in the slot of code (1000, 2000-2019) and returns the handler
@@ -25,6 +91,376 @@ TOVA_API intptr_t TOVA_CALL grdAddCommonErrorHandler(grdErrorHandler handler);
 TOVA_API void TOVA_CALL grdInitSystem(void);
 /* Sets the API trace flag to flag as given; returns flag. */
 TOVA_API int32_t TOVA_CALL grdDebugOn(int32_t flag);
+
+
+/* ---- Conventions of the header model -------------------------------------
+ * Every function returns a status (0, or a code of status.h) unless said
+ * otherwise; a failure is passed to the registered error handler first.
+ * Getters that return a value give a fixed fallback for a null handle. Texts
+ * and arrays handed to setters are copied; those handed out by getters are
+ * lent: they stay owned by the header and valid until the next setter of the
+ * same attribute or the header's destruction. Every out pointer may be null
+ * and is then skipped, unless said otherwise. */
+
+/* ---- Header object -------------------------------------------------------- */
+
+/* Makes a header: 2010 when statsType is not 1-3 or noOfItems is below 1.
+ * *header is written in every case (null on failure). */
+TOVA_API int32_t TOVA_CALL grdHeaderCreate(int32_t fileType, const char* fileTitle, const char* appTitle,
+                                           int32_t appVersionNo, int32_t noOfItems, int32_t statsType,
+                                           HeaderHandle* header);
+/* Frees the header and everything it owns; sets *header to null. */
+TOVA_API int32_t TOVA_CALL grdHeaderDestroy(HeaderHandle* header);
+
+TOVA_API const char* TOVA_CALL grdFileTypeStr(int32_t fileType);
+TOVA_API const char* TOVA_CALL grdTimeAxisTypeStr(int32_t timeAxisType);
+TOVA_API const char* TOVA_CALL grdSimpleTypeStr(int32_t simpleType);
+/* 206. */
+TOVA_API int32_t TOVA_CALL grdGetVersionCurrent(void);
+
+/* ---- File-level attributes ------------------------------------------------ */
+
+TOVA_API int32_t TOVA_CALL grdGetFileType(HeaderHandle header);                 /* null: 0 */
+TOVA_API const char* TOVA_CALL grdGetFileTitle(HeaderHandle header);            /* never null */
+TOVA_API int32_t TOVA_CALL grdSetFileTitle(HeaderHandle header, const char* title);
+TOVA_API const char* TOVA_CALL grdGetAppTitle(HeaderHandle header);             /* never null */
+TOVA_API int32_t TOVA_CALL grdSetAppTitle(HeaderHandle header, const char* title);
+TOVA_API int32_t TOVA_CALL grdGetAppVersionNo(HeaderHandle header);             /* null: -1 */
+TOVA_API int32_t TOVA_CALL grdSetAppVersionNo(HeaderHandle header, int32_t versionNo);
+/* Caller-defined content class; its absolute value names the extension. */
+TOVA_API int32_t TOVA_CALL grdGetDataType(HeaderHandle header);                 /* null: 0 */
+TOVA_API int32_t TOVA_CALL grdSetDataType(HeaderHandle header, int32_t dataType);
+TOVA_API int32_t TOVA_CALL grdGetItemStatsType(HeaderHandle header);            /* null: 0 */
+
+/* Delete values per element type (null header: 0). Setters do not validate. */
+TOVA_API float TOVA_CALL grdGetDeleteValFloat(HeaderHandle header);
+TOVA_API double TOVA_CALL grdGetDeleteValDouble(HeaderHandle header);
+TOVA_API char TOVA_CALL grdGetDeleteValByte(HeaderHandle header);
+TOVA_API int32_t TOVA_CALL grdGetDeleteValInt(HeaderHandle header);
+TOVA_API uint32_t TOVA_CALL grdGetDeleteValUnsignedInt(HeaderHandle header);
+TOVA_API int32_t TOVA_CALL grdSetDeleteValFloat(HeaderHandle header, float value);
+TOVA_API int32_t TOVA_CALL grdSetDeleteValDouble(HeaderHandle header, double value);
+TOVA_API int32_t TOVA_CALL grdSetDeleteValByte(HeaderHandle header, char value);
+TOVA_API int32_t TOVA_CALL grdSetDeleteValInt(HeaderHandle header, int32_t value);
+TOVA_API int32_t TOVA_CALL grdSetDeleteValUnsignedInt(HeaderHandle header, uint32_t value);
+
+/* Whether the calendar getters apply the start offset to the date (1 at
+ * creation). */
+TOVA_API int32_t TOVA_CALL grdParamModifyTimes(HeaderHandle header, int32_t flag);
+
+/* Map projection. */
+TOVA_API int32_t TOVA_CALL grdGetGeoInfoType(HeaderHandle header);              /* null: 0 */
+TOVA_API int32_t TOVA_CALL grdSetGeoInfoUTMProj(HeaderHandle header, const char* projection, double longitude,
+                                                double latitude, double orientation);
+/* Changes the projection of a header already written, without changing its
+ * size: only when a projection is set and the new text is not longer than the
+ * stored one (the stored length is kept, padded with blanks). Otherwise 2010,
+ * returned without calling the error handler. */
+TOVA_API int32_t TOVA_CALL grdUpdateGeoInfoUTMProj(HeaderHandle header, const char* projection,
+                                                   double longitude, double latitude, double orientation);
+/* 1000 when no projection is set, 2010 for an unknown geo info type. */
+TOVA_API int32_t TOVA_CALL grdGetGeoInfoUTMProj(HeaderHandle header, const char** projection, double* longitude,
+                                                double* latitude, double* orientation);
+TOVA_API int32_t TOVA_CALL grdSetGeoInfoUndefined(HeaderHandle header);
+
+/* Custom blocks: named arrays of a simple type (1-7) kept in insertion order.
+ * Other types keep their name and count but no data. */
+TOVA_API int32_t TOVA_CALL grdAddCustomBlock(HeaderHandle header, int32_t simpleType, const char* name,
+                                             int32_t count, const void* data);
+/* The first block, null when there is none. */
+TOVA_API int32_t TOVA_CALL grdGetCustomBlockRef(HeaderHandle header, CustomBlockHandle* block);
+/* *data is written only for types 1-7. */
+TOVA_API int32_t TOVA_CALL grdGetCustomBlock(CustomBlockHandle block, int32_t* simpleType, const char** name,
+                                             int32_t* count, const void** data, CustomBlockHandle* next);
+
+/* ---- Items ---------------------------------------------------------------- */
+
+TOVA_API int32_t TOVA_CALL grdGetNoOfItems(HeaderHandle header);                /* null: 0 */
+/* Item itemNo (1-based); null when the header is null or the number is out
+ * of range (2007). */
+TOVA_API ItemHandle TOVA_CALL grdItemD(HeaderHandle header, int32_t itemNo);
+/* The item of a static item (the static item itself); null when null. */
+TOVA_API ItemHandle TOVA_CALL grdItemS(ItemHandle staticItem);
+
+/* Resets the item and gives it a name, quantity type, unit and data type
+ * (simple type 1-7) and an EqD0 axis; 2020 when the unit does not suit the
+ * quantity type. */
+TOVA_API int32_t TOVA_CALL grdSetItemInfo(HeaderHandle header, ItemHandle item, int32_t itemType, const char* name,
+                                          int32_t unit, int32_t dataType);
+/* As grdSetItemInfo with the unit as a text (unit key 0, no unit test). */
+TOVA_API int32_t TOVA_CALL grdSetItemInfo_(HeaderHandle header, ItemHandle item, int32_t itemType,
+                                           const char* name, const char* unitText, int32_t dataType);
+/* For an item already written: the name keeps its stored length (blank
+ * padded or cut); quantity type and unit are replaced. */
+TOVA_API int32_t TOVA_CALL grdUpdateItemInfo(HeaderHandle header, ItemHandle item, int32_t itemType,
+                                             const char* name, int32_t unit);
+TOVA_API int32_t TOVA_CALL grdGetItemInfo(ItemHandle item, int32_t* itemType, const char** itemTypeText,
+                                          const char** name, int32_t* unit, const char** unitText,
+                                          int32_t* dataType);
+/* The stored fields as they are (the unit text may be null). */
+TOVA_API int32_t TOVA_CALL grdGetItemInfo_(ItemHandle item, int32_t* itemType, const char** name,
+                                           const char** unitText, int32_t* dataType);
+
+/* Settings stored and returned unchanged. */
+TOVA_API int32_t TOVA_CALL grdSetItemValueType(ItemHandle item, int32_t valueType);
+TOVA_API int32_t TOVA_CALL grdGetItemValueType(ItemHandle item, int32_t* valueType); /* out required */
+TOVA_API int32_t TOVA_CALL grdSetItemUnitConversion(ItemHandle item, int32_t mode, int32_t unit);
+TOVA_API int32_t TOVA_CALL grdGetItemUnitConversion(ItemHandle item, int32_t* mode, int32_t* unit);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisUnitConversion(ItemHandle item, int32_t mode, int32_t unit);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisUnitConversion(ItemHandle item, int32_t* mode, int32_t* unit);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisOrientation(ItemHandle item, float alpha, float phi, float theta);
+/* Null item: -1e-35 in every output. */
+TOVA_API int32_t TOVA_CALL grdGetItemAxisOrientation(ItemHandle item, float* alpha, float* phi, float* theta);
+/* Reference coordinates, converted by the axis unit conversion mode. */
+TOVA_API int32_t TOVA_CALL grdSetItemRefCoords(ItemHandle item, float x, float y, float z);
+/* Null item: -1e-35 in every output. */
+TOVA_API int32_t TOVA_CALL grdGetItemRefCoords(ItemHandle item, float* x, float* y, float* z);
+
+/* Quantity type of the axis: 100185-100188 for 0-D to 3-D axes, else 999. */
+TOVA_API int32_t TOVA_CALL grdGetItemGeometryType(ItemHandle item);
+TOVA_API int32_t TOVA_CALL grdGetItemGeometryUnit(ItemHandle item);
+/* Dimension of the axis: 0-4; -1 for undefined and curvilinear axes. */
+TOVA_API int32_t TOVA_CALL grdGetItemDim(ItemHandle item);
+
+/* Sizes (0 with 2010 reported where the axis kind has no such size, or the
+ * product exceeds 2147483647). */
+TOVA_API int32_t TOVA_CALL grdGetItemXSize(ItemHandle item);
+TOVA_API int32_t TOVA_CALL grdGetItemXYSize(ItemHandle item);
+TOVA_API int32_t TOVA_CALL grdGetItemXYZSize(ItemHandle item);
+/* Element counts: full, or capped at the key length for a compressed item
+ * (Used: whenever the file is compressed; plain: once compression is
+ * enabled too). Bytes: those counts times the element size. */
+TOVA_API int32_t TOVA_CALL grdGetItemElements(ItemHandle item);
+TOVA_API int32_t TOVA_CALL grdGetUsedItemElements(ItemHandle item);
+TOVA_API int32_t TOVA_CALL grdGetItemBytes(ItemHandle item);
+TOVA_API int32_t TOVA_CALL grdGetUsedItemBytes(ItemHandle item);
+
+/* Static associations: links from item itemNo to static item numbers. */
+TOVA_API int32_t TOVA_CALL grdSetAssocStatic(HeaderHandle header, int32_t itemNo, int32_t staticNo);
+TOVA_API int32_t TOVA_CALL grdGetNoAssocStatic(HeaderHandle header, int32_t itemNo); /* error: 0 */
+/* index is 1-based; *staticNo is 0 when the chain is shorter. */
+TOVA_API int32_t TOVA_CALL grdGetAssocStatic(HeaderHandle header, int32_t itemNo, int32_t index,
+                                             int32_t* staticNo);
+
+/* Encoding keys of a compressed file: entry i of the x, y and z keys is the
+ * grid position of the i-th stored element. Setting them marks the file
+ * compressed; a key not given is absent. */
+TOVA_API int32_t TOVA_CALL grdSetEncodeKey(HeaderHandle header, const int32_t* xKey, const int32_t* yKey,
+                                           const int32_t* zKey, int32_t length);
+/* Copies each stored key into the caller's buffer of the same position. */
+TOVA_API int32_t TOVA_CALL grdGetEncodeKey(HeaderHandle header, int32_t* xKey, int32_t* yKey, int32_t* zKey);
+TOVA_API int32_t TOVA_CALL grdGetEncodeKeySize(HeaderHandle header);   /* null: 0 */
+TOVA_API int32_t TOVA_CALL grdIsFileCompressed(HeaderHandle header);   /* null: 0 */
+/* Lets grdGetItemElements count only the key's elements; returns header. */
+TOVA_API HeaderHandle TOVA_CALL grdItemEnableCompression(HeaderHandle header);
+/* *length := the key length when the item's header holds an x and a y key,
+ * else 0. Returns the status of the item check. */
+TOVA_API int32_t TOVA_CALL grdIsItemCompressed(ItemHandle item, int32_t* length);
+
+/* ---- Item spatial axes ----------------------------------------------------
+ * Setters copy the caller's arrays and convert the values into the stored
+ * axis unit by the item's axis unit conversion mode. Getters give the unit,
+ * its text, the sizes and the values converted for the caller; coordinate
+ * arrays are the item's own, converted in place (a second call with a
+ * conversion mode of 1-3 converts them again). A non-equidistant direction of
+ * size n holds n + 1 boundary coordinates; a curvilinear array one value per
+ * node ((X+1)(Y+1) or (X+1)(Y+1)(Z+1)). The last int32 of the coordinate
+ * setters is not used. */
+
+TOVA_API int32_t TOVA_CALL grdGetItemAxisType(ItemHandle item);        /* null: 0 */
+
+TOVA_API int32_t TOVA_CALL grdSetItemAxisEqD0(ItemHandle item, int32_t unit);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisEqD0(ItemHandle item, int32_t* unit, const char** unitText);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisEqD1(ItemHandle item, int32_t unit, int32_t xSize, float x0, float dx);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisEqD1(ItemHandle item, int32_t* unit, const char** unitText,
+                                              int32_t* xSize, float* x0, float* dx);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisEqD2(ItemHandle item, int32_t unit, int32_t xSize, int32_t ySize, float x0,
+                                              float y0, float dx, float dy);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisEqD2(ItemHandle item, int32_t* unit, const char** unitText,
+                                              int32_t* xSize, int32_t* ySize, float* x0, float* y0, float* dx,
+                                              float* dy);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisEqD3(ItemHandle item, int32_t unit, int32_t xSize, int32_t ySize,
+                                              int32_t zSize, float x0, float y0, float z0, float dx, float dy,
+                                              float dz);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisEqD3(ItemHandle item, int32_t* unit, const char** unitText,
+                                              int32_t* xSize, int32_t* ySize, int32_t* zSize, float* x0, float* y0,
+                                              float* z0, float* dx, float* dy, float* dz);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisEqD4(ItemHandle item, int32_t unit, int32_t xSize, int32_t ySize,
+                                              int32_t zSize, int32_t tSize, float x0, float y0, float z0, float t0,
+                                              float dx, float dy, float dz, float dt);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisEqD4(ItemHandle item, int32_t* unit, const char** unitText,
+                                              int32_t* xSize, int32_t* ySize, int32_t* zSize, int32_t* tSize,
+                                              float* x0, float* y0, float* z0, float* t0, float* dx, float* dy,
+                                              float* dz, float* dt);
+
+TOVA_API int32_t TOVA_CALL grdSetItemAxisNeqD1(ItemHandle item, int32_t unit, int32_t xSize, const double* xCoords,
+                                               int32_t unused);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisNeqD1(ItemHandle item, int32_t* unit, const char** unitText,
+                                               int32_t* xSize, const double** xCoords);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisNeqD2(ItemHandle item, int32_t unit, int32_t xSize, int32_t ySize,
+                                               const double* xCoords, const double* yCoords, int32_t unused);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisNeqD2(ItemHandle item, int32_t* unit, const char** unitText,
+                                               int32_t* xSize, int32_t* ySize, const double** xCoords,
+                                               const double** yCoords);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisNeqD3(ItemHandle item, int32_t unit, int32_t xSize, int32_t ySize,
+                                               int32_t zSize, const double* xCoords, const double* yCoords,
+                                               const double* zCoords, int32_t unused);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisNeqD3(ItemHandle item, int32_t* unit, const char** unitText,
+                                               int32_t* xSize, int32_t* ySize, int32_t* zSize,
+                                               const double** xCoords, const double** yCoords,
+                                               const double** zCoords);
+
+TOVA_API int32_t TOVA_CALL grdSetItemAxisCurveLinearD2(ItemHandle item, int32_t unit, int32_t xSize, int32_t ySize,
+                                                       const double* xNodes, const double* yNodes, int32_t unused);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisCurveLinearD2(ItemHandle item, int32_t* unit, const char** unitText,
+                                                       int32_t* xSize, int32_t* ySize, const double** xNodes,
+                                                       const double** yNodes);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisCurveLinearD3(ItemHandle item, int32_t unit, int32_t xSize, int32_t ySize,
+                                                       int32_t zSize, const double* xNodes, const double* yNodes,
+                                                       const double* zNodes, int32_t unused);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisCurveLinearD3(ItemHandle item, int32_t* unit, const char** unitText,
+                                                       int32_t* xSize, int32_t* ySize, int32_t* zSize,
+                                                       const double** xNodes, const double** yNodes,
+                                                       const double** zNodes);
+
+/* Time-varying axes: only the sizes; coordinates travel with the data. */
+TOVA_API int32_t TOVA_CALL grdSetItemAxisTvarD1(ItemHandle item, int32_t unit, int32_t xSize);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisTvarD1(ItemHandle item, int32_t* unit, const char** unitText,
+                                                int32_t* xSize);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisTvarD2(ItemHandle item, int32_t unit, int32_t xSize, int32_t ySize);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisTvarD2(ItemHandle item, int32_t* unit, const char** unitText,
+                                                int32_t* xSize, int32_t* ySize);
+TOVA_API int32_t TOVA_CALL grdSetItemAxisTvarD3(ItemHandle item, int32_t unit, int32_t xSize, int32_t ySize,
+                                                int32_t zSize);
+TOVA_API int32_t TOVA_CALL grdGetItemAxisTvarD3(ItemHandle item, int32_t* unit, const char** unitText,
+                                                int32_t* xSize, int32_t* ySize, int32_t* zSize);
+
+/* ---- Time axes ------------------------------------------------------------
+ * Equidistant kinds belong to file types 1 and 2, non-equidistant kinds to
+ * 4, 8 and 16: the other family gives 1000, an unknown file type 2010.
+ * Calendar dates are "yyyy-mm-dd", times "hh:mm:ss" (digits are not
+ * range-checked): 2011 / 2012 otherwise. */
+
+TOVA_API int32_t TOVA_CALL grdSetEqTimeAxis(HeaderHandle header, int32_t unit, double startTime, double timeStep,
+                                            int32_t firstIndex);
+/* The start time is accepted and not stored. */
+TOVA_API int32_t TOVA_CALL grdSetNeqTimeAxis(HeaderHandle header, int32_t unit, double startTime,
+                                             int32_t firstIndex);
+TOVA_API int32_t TOVA_CALL grdSetEqCalendarAxis(HeaderHandle header, const char* startDate, const char* startTime,
+                                                int32_t unit, double startOffset, double timeStep,
+                                                int32_t firstIndex);
+/* The start offset is accepted and not stored. */
+TOVA_API int32_t TOVA_CALL grdSetNeqCalendarAxis(HeaderHandle header, const char* startDate,
+                                                 const char* startTime, int32_t unit, double startOffset,
+                                                 int32_t firstIndex);
+
+TOVA_API int32_t TOVA_CALL grdGetTimeAxisType(HeaderHandle header);   /* null: 0 */
+TOVA_API int32_t TOVA_CALL grdGetEqTimeAxis(HeaderHandle header, int32_t* unit, const char** unitText,
+                                            double* startTime, double* timeStep, int32_t* noOfTimeSteps,
+                                            int32_t* firstIndex);
+TOVA_API int32_t TOVA_CALL grdGetNeqTimeAxis(HeaderHandle header, int32_t* unit, const char** unitText,
+                                             double* startTime, double* timeStep, int32_t* noOfTimeSteps,
+                                             int32_t* firstIndex);
+/* With the modify-times flag set and a non-zero start offset, the date and
+ * time given out are the start advanced by the offset, and the offset given
+ * is 0; otherwise the stored texts and offset. */
+TOVA_API int32_t TOVA_CALL grdGetEqCalendarAxis(HeaderHandle header, int32_t* unit, const char** unitText,
+                                                const char** startDate, const char** startTime,
+                                                double* startOffset, double* timeStep, int32_t* noOfTimeSteps,
+                                                int32_t* firstIndex);
+TOVA_API int32_t TOVA_CALL grdGetNeqCalendarAxis(HeaderHandle header, int32_t* unit, const char** unitText,
+                                                 const char** startDate, const char** startTime,
+                                                 double* startOffset, double* timeStep, int32_t* noOfTimeSteps,
+                                                 int32_t* firstIndex);
+/* Time covered by the file's time steps; -1e-255 when the header has no time
+ * axis. */
+TOVA_API int32_t TOVA_CALL _grdGetTimeAxisSpan(HeaderHandle header, FileHandle file, double* span);
+
+/* ---- File lifecycle --------------------------------------------------------
+ * A data file holds the header stream, then the static items, then the
+ * dynamic time-step data. Opening yields a header and a file handle; every
+ * later call takes both. Bad names are refused with a status and never
+ * reported (create 2002, read 2003, delete 1000). */
+TOVA_API int32_t TOVA_CALL grdFileCreate(const char* name, HeaderHandle header, FileHandle* file);
+/* readable non-zero: the file may also be read back while it is written. */
+TOVA_API int32_t TOVA_CALL grdFileCreateEx(const char* name, HeaderHandle header, FileHandle* file,
+                                           int32_t readable);
+TOVA_API int32_t TOVA_CALL grdFileRead(const char* name, HeaderHandle* header, FileHandle* file);
+TOVA_API int32_t TOVA_CALL grdFileEdit(const char* name, HeaderHandle* header, FileHandle* file);
+TOVA_API int32_t TOVA_CALL grdFileAppend(const char* name, HeaderHandle* header, FileHandle* file);
+TOVA_API int32_t TOVA_CALL grdFileFlush(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdFileFlushTimeStep(HeaderHandle header, FileHandle file);
+/* Rewrites the header of a writable file, then closes it and nulls *file.
+ * When the final header update fails the file stays open (retry possible). */
+TOVA_API int32_t TOVA_CALL grdFileClose(HeaderHandle header, FileHandle* file);
+TOVA_API int32_t TOVA_CALL grdFileDelete(const char* name);
+
+/* ---- Static items ------------------------------------------------------------
+ * A static item is an item that carries its own values; it is usable
+ * wherever an ItemHandle is taken (info and axis setters and getters). */
+TOVA_API int32_t TOVA_CALL grdStaticCreate(ItemHandle* staticItem);
+TOVA_API int32_t TOVA_CALL grdStaticDestroy(ItemHandle* staticItem);
+TOVA_API int32_t TOVA_CALL grdStaticSetHeader(HeaderHandle header, ItemHandle staticItem);
+TOVA_API int32_t TOVA_CALL grdStaticWrite(ItemHandle staticItem, FileHandle file, const void* values);
+/* The next static item of the file (destroy it with grdStaticDestroy), or
+ * null at the end of the static section (status 0) or on failure. */
+TOVA_API ItemHandle TOVA_CALL grdStaticRead(FileHandle file, int32_t* status);
+TOVA_API int32_t TOVA_CALL grdStaticGetData(ItemHandle staticItem, void* buffer);
+TOVA_API int32_t TOVA_CALL grdStaticSkip(FileHandle file);
+
+/* ---- Dynamic time-step data --------------------------------------------------
+ * Calls never name an item or a time step: the header's cursor (next item,
+ * time steps done) decides, and every write, read or skip advances it. */
+TOVA_API int32_t TOVA_CALL grdWriteStartBlockDynamic(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdWriteItemTimeStep(HeaderHandle header, FileHandle file, double time,
+                                                const void* data);
+/* data may be null: the item's values are skipped. */
+TOVA_API int32_t TOVA_CALL grdReadItemTimeStep(HeaderHandle header, FileHandle file, double* time, void* data);
+TOVA_API int32_t TOVA_CALL grdSkipItem(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdSkipTimeStep(HeaderHandle header, FileHandle file);
+/* Rounds the used elements of item itemNo in place to digits significant
+ * decimal digits; delete values and zeros stay. Always 0. */
+TOVA_API int32_t TOVA_CALL grdTruncateItemTimeStep(HeaderHandle header, int32_t itemNo, int32_t digits, void* data);
+
+/* Placeholders for time-varying and free-item data: they do nothing and
+ * return 1. */
+TOVA_API int32_t TOVA_CALL grdWriteItemTvarTimeStep(HeaderHandle header, FileHandle file, double time,
+                                                    const void* coordinates, const void* data);
+TOVA_API int32_t TOVA_CALL grdReadItemTvarTimeStep(HeaderHandle header, FileHandle file, double* time,
+                                                   void* coordinates, void* data);
+TOVA_API int32_t TOVA_CALL grdQueryFreeItemTimeStep(HeaderHandle header, FileHandle file, int32_t* itemNo,
+                                                    int32_t* elements);
+TOVA_API int32_t TOVA_CALL grdQueryFreeItemTvarTimeStep(HeaderHandle header, FileHandle file, int32_t* itemNo,
+                                                        int32_t* elements);
+TOVA_API int32_t TOVA_CALL grdReadFreeItemTimeStep(HeaderHandle header, FileHandle file, double* time,
+                                                   int32_t* itemNo, void* data);
+TOVA_API int32_t TOVA_CALL grdReadFreeItemTvarTimeStep(HeaderHandle header, FileHandle file, double* time,
+                                                       int32_t* itemNo, void* coordinates, void* data);
+TOVA_API int32_t TOVA_CALL grdWriteFreeItemTimeStep(HeaderHandle header, FileHandle file, double time,
+                                                    int32_t itemNo, int32_t elements, const void* data);
+TOVA_API int32_t TOVA_CALL grdWriteFreeItemTvarTimeStep(HeaderHandle header, FileHandle file, double time,
+                                                        int32_t itemNo, int32_t elements, const void* coordinates,
+                                                        const void* data);
+
+/* ---- Positioning ----------------------------------------------------------------
+ * 1001 (time step out of range) and 1002 (no such item or static item) are
+ * returned without calling any handler. */
+TOVA_API int32_t TOVA_CALL grdFindBlock(FileHandle file, int32_t blockCode);
+TOVA_API int32_t TOVA_CALL grdFindBlockStatic(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdFindBlockDynamic(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdFindItemStatic(HeaderHandle header, FileHandle file, int32_t staticItemNo);
+TOVA_API int32_t TOVA_CALL grdFindTimeStep(HeaderHandle header, FileHandle file, int32_t timeStep);
+TOVA_API int32_t TOVA_CALL grdFindItemDynamic(HeaderHandle header, FileHandle file, int32_t timeStep,
+                                              int32_t itemNo);
+
+/* ---- Statistics ------------------------------------------------------------------ */
+/* Per-element statistics (statistics types 2 and 3); element is 0-based.
+ * Every out pointer is optional. */
+TOVA_API int32_t TOVA_CALL grdGetItemStats(HeaderHandle header, int32_t itemNo, int32_t element, double* minimum,
+                                           double* maximum, double* mean, double* stdDev, double* autoCorrelation,
+                                           int32_t* values, int32_t* deletes, int32_t* pairs);
+TOVA_API int32_t TOVA_CALL grdGetItemStatsGlobal(ItemHandle item, double* minimum, double* maximum,
+                                                 int32_t* deletes);
 
 TOVA_EXTERN_C_END
 

@@ -2,11 +2,11 @@
 suite, and its units, from Python.
 
 Submodules: ``units`` (quantities, units, conversions), ``vre`` (VRE files),
-``errors`` (status codes and ``TovaError``). The C libraries are found as
+``xsec`` (cross-section files), ``errors`` (status codes and ``TovaError``). The C libraries are found as
 ``tova._lib`` describes and loaded on first use.
 """
 
-from . import errors, units, vre
+from . import errors, units, vre, xsec
 from ._lib import ENV_VAR, LibraryNotFoundError, library_paths
 from .errors import TovaError, UnitError
 
@@ -21,4 +21,5 @@ __all__ = [
     "library_paths",
     "units",
     "vre",
+    "xsec",
 ]

@@ -35,6 +35,8 @@ from ctypes import (
     c_float,
     c_int,
     c_int32,
+    c_uint16,
+    c_uint32,
     c_void_p,
 )
 from pathlib import Path
@@ -213,6 +215,55 @@ TOVA_PROTOTYPES = {
     "vreGetVectorItem": (i32, [VreHandle, i32, p_double]),
     "vreSetVectorItem": (i32, [VreHandle, i32, p_double]),
 }
+
+
+
+class XsecData(ctypes.Structure):
+    """The record of one cross section, laid out as the C header has it:
+    packed on 2-byte boundaries, pointers of the platform's width."""
+
+    _pack_ = 2
+    _fields_ = [
+        ("keyValue", c_double),
+        ("primaryName", c_char_p),
+        ("secondaryName", c_char_p),
+        ("extraName", c_char_p),
+        ("headerWords", c_uint16 * 25),
+        ("headerValues", c_double * 23),
+        ("noRaw", c_uint32),
+        ("raw", POINTER(c_double) * 3),
+        ("noSel", c_uint32),
+        ("sel", POINTER(c_double)),
+        ("noPrc", c_uint32),
+        ("prc", POINTER(c_double) * 6),
+        ("raw3", POINTER(c_double)),
+        ("rawMark", POINTER(c_uint16) * 2),
+        ("noCoords", c_uint32),
+        ("coords", POINTER(c_double) * 3),
+        ("owner", c_void_p),
+    ]
+
+
+XsecHandle = POINTER(XsecData)
+p_handle = POINTER(c_void_p)
+TOVA_PROTOTYPES.update({
+    "xfsFileOpenCreate": (i32, [c_char_p, p_handle]),
+    "xfsFileClose": (i32, [p_handle]),
+    "xfsGetError": (i32, [c_void_p]),
+    "xfsPeekError": (i32, [c_void_p]),
+    "xfsXsecTableLoad": (i32, [c_char_p, p_handle, c_uint32]),
+    "xfsXsecTableFree": (None, [p_handle]),
+    "xfsXsecTableVersion": (i32, [c_void_p]),
+    "xfsXsecCreateEx": (XsecHandle, [c_char_p, c_double, c_char_p, c_char_p]),
+    "xfsXsecFree": (None, [POINTER(XsecHandle)]),
+    "xfsXsecSetNoCoords": (i32, [XsecHandle, c_uint32]),
+    "xfsXsecSetNoPrc": (i32, [XsecHandle, c_uint32]),
+    "xfsXsecSetNoRaw": (i32, [XsecHandle, c_uint32]),
+    "xfsXsecSetNoSel": (i32, [XsecHandle, c_uint32]),
+    "xfsXsecWrite": (i32, [XsecHandle, c_void_p]),
+    "xfsXsecFind": (XsecHandle, [c_void_p, c_char_p, c_double, c_char_p, p_handle]),
+    "xfsXsecFindNext": (XsecHandle, [c_void_p, c_void_p]),
+})
 
 
 def _missing(lib_name: str, name: str):

@@ -1,5 +1,7 @@
 """VRE files read into and written from plain objects."""
 
+import struct
+
 import numpy as np
 import pytest
 
@@ -105,3 +107,19 @@ def test_read_failures_name_the_file(tmp_path):
     with pytest.raises(TovaError) as info:
         vre.read(junk)
     assert info.value.status == 2014
+
+
+def test_a_body_count_beyond_the_file_is_refused(tmp_path):
+    v = vre.new()
+    v.params[5] = 0x5A5A  # marks the place of the body count in the file
+    v.params[1] = 1
+    v.panel_counts = np.array([2], dtype=np.int32)
+    path = tmp_path / "bodies.vre"
+    v.write(path)
+    data = path.read_bytes()
+    marker = bytes([4]) + struct.pack("<Ii", 1, 0x5A5A) + bytes([4]) + struct.pack("<Ii", 1, 1)
+    at = data.index(marker) + len(marker) - 4
+    path.write_bytes(data[:at] + struct.pack("<i", 1_000_000) + data[at + 4:])
+    with pytest.raises(TovaError) as info:
+        vre.read(path)
+    assert info.value.status == 2013 and "1000000" in str(info.value)

@@ -171,8 +171,14 @@ class _Handle:
 def read(path: str | os.PathLike) -> Vre:
     """Reads a VRE file. Raises TovaError when it cannot be opened or is not
     a VRE file. Values are in each item's storage unit."""
+    name = os.fspath(path)
     with _Handle() as h:
-        check(h.lib.vreFileRead(_lib.encode(path), byref(h.handle)), os.fspath(path))
+        check(h.lib.vreFileRead(_lib.encode(path), byref(h.handle)), name)
+        # Every file holds B panel counts of 4 bytes: a larger body count
+        # comes from a damaged file and would only make huge zero buffers.
+        bodies = h.lib.vreGetVectorParam(h.handle, 1)
+        if bodies * 4 > os.path.getsize(path):
+            raise TovaError(F_ERR_SIZE, name, f"body count {bodies} is more than the file can hold")
         return _from_handle(h.lib, h.handle)
 
 

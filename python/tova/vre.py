@@ -156,9 +156,9 @@ class _Handle:
     """A VreHandle freed on leaving the block; holds the library lock."""
 
     def __enter__(self):
-        _lib.lock.acquire()
         self.lib = _lib.tova()
         self.handle = _lib.VreHandle()
+        _lib.lock.acquire()
         return self
 
     def __exit__(self, *exc):
@@ -209,9 +209,7 @@ def _set_unit(setter, info, handle, index: int, item: VreItem, what: str) -> Non
     check(setter(handle, index, _int32(item.unit, what)), what)
 
 
-def _set_names(lib, handle, names: list[str], bodies: int) -> None:
-    if len(names) != bodies:
-        raise TovaError(F_ERR_SIZE, "body names", f"{len(names)} names for {bodies} bodies")
+def _set_names(lib, handle, names: list[str]) -> None:
     encoded = [n.encode(NAME_ENCODING) for n in names]
     if any(len(e) >= NAME_LENGTH or b"\0" in e for e in encoded):
         raise TovaError(F_ERR_VALUE, "body names", f"names are at most {NAME_LENGTH - 1} bytes without zeros")
@@ -227,10 +225,12 @@ def _fill(lib, handle, vre: Vre) -> None:
     counts = np.ascontiguousarray(vre.panel_counts, dtype=np.int32)
     if counts.shape != (max(bodies, 0),):
         raise TovaError(F_ERR_SIZE, "panel counts", f"{counts.size} panel counts for {bodies} bodies")
+    if vre.names is not None and len(vre.names) != counts.size:
+        raise TovaError(F_ERR_SIZE, "body names", f"{len(vre.names)} names for {bodies} bodies")
     if bodies > 0:
         check(lib.vreSetBodyPanelCount(handle, _lib.as_pointer(counts, c_int32)), "panel counts")
         if vre.names is not None:
-            _set_names(lib, handle, vre.names, bodies)
+            _set_names(lib, handle, vre.names)
     check(lib.vreSetSymmetry(handle, *(_int32(s, "symmetry") for s in vre.symmetry)), "symmetry")
 
     if len(vre.scalars) not in (0, SCALAR_ITEMS):

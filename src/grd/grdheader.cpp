@@ -490,9 +490,9 @@ constexpr int32_t kTagProjection = 10011;
 constexpr int32_t kTagDataType = 10012;
 constexpr int32_t kTagCompressed = 10013;
 constexpr int32_t kTagTimeOlder = 20000;  // + kind 1-4: the time unit is a text
-constexpr int32_t kTagTime = 20050;  // + kind 1-4
+constexpr int32_t kTagTime = 20050;       // + kind 1-4
 constexpr int32_t kTagAxisOlder = 31000;  // + axis type 1-10: no axis unit
-constexpr int32_t kTagAxis = 31050;  // + axis type 1-10
+constexpr int32_t kTagAxis = 31050;       // + axis type 1-10
 constexpr int32_t kTagCurveLinearD2 = 31061;
 constexpr int32_t kTagCurveLinearD3 = 31062;
 
@@ -547,6 +547,7 @@ int64_t coordValues(int32_t axisType, const int32_t* size, int32_t d) {
     int64_t nodes = 1;
     for (int32_t i = 0; i < axisDirs(axisType); ++i) {
         const int64_t factor = int64_t{size[i]} + 1;
+        if (factor <= 0) return 0;
         if (nodes > kOver / factor) return kOver;
         nodes *= factor;
     }
@@ -657,7 +658,8 @@ private:
 
 void OutBlock::text(const char* text) {
     const size_t length = std::strlen(text);
-    if (shapeAt_ == nullptr || shapeAt_->type != RCF_BYTE) return add(RCF_BYTE, length + 1, text);
+    if (shapeAt_ == nullptr || shapeAt_->type != RCF_BYTE || shapeAt_->count == 0)
+        return add(RCF_BYTE, length + 1, text);
     const uint32_t stored = shapeAt_->count;  // text and terminator
     GrdArray<char> fitted = grdAllocArray<char>(stored);
     if (!fitted) return fail(report(header_, nullptr, F_ERR_MEMORY, __LINE__));

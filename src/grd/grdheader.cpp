@@ -490,9 +490,9 @@ constexpr int32_t kTagProjection = 10011;
 constexpr int32_t kTagDataType = 10012;
 constexpr int32_t kTagCompressed = 10013;
 constexpr int32_t kTagTimeOlder = 20000;  // + kind 1-4: the time unit is a text
-constexpr int32_t kTagTime = 20050;  // + kind 1-4
+constexpr int32_t kTagTime = 20050;       // + kind 1-4
 constexpr int32_t kTagAxisOlder = 31000;  // + axis type 1-10: no axis unit
-constexpr int32_t kTagAxis = 31050;  // + axis type 1-10
+constexpr int32_t kTagAxis = 31050;       // + axis type 1-10
 constexpr int32_t kTagCurveLinearD2 = 31061;
 constexpr int32_t kTagCurveLinearD3 = 31062;
 
@@ -547,6 +547,7 @@ int64_t coordValues(int32_t axisType, const int32_t* size, int32_t d) {
     int64_t nodes = 1;
     for (int32_t i = 0; i < axisDirs(axisType); ++i) {
         const int64_t factor = int64_t{size[i]} + 1;
+        if (factor <= 0) return 0;
         if (nodes > kOver / factor) return kOver;
         nodes *= factor;
     }
@@ -657,7 +658,8 @@ private:
 
 void OutBlock::text(const char* text) {
     const size_t length = std::strlen(text);
-    if (shapeAt_ == nullptr || shapeAt_->type != RCF_BYTE) return add(RCF_BYTE, length + 1, text);
+    if (shapeAt_ == nullptr || shapeAt_->type != RCF_BYTE || shapeAt_->count == 0)
+        return add(RCF_BYTE, length + 1, text);
     const uint32_t stored = shapeAt_->count;  // text and terminator
     GrdArray<char> fitted = grdAllocArray<char>(stored);
     if (!fitted) return fail(report(header_, nullptr, F_ERR_MEMORY, __LINE__));
@@ -1423,4 +1425,215 @@ HeaderHandle grdReadHeader(FileHandle file, int32_t* status) {
     if (status != nullptr) *status = code;
     trace.done(code);
     return header.release();
+}
+
+// ---- In-place updates -------------------------------------------------------------------------------
+// A header already on disk is brought up to date through a second handle
+// on the same file: each block is read as it stands, filled afresh from
+// the header (texts keep their stored length) and written back at its own
+// position, giving the bytes that grdWriteHeader would write. A block whose
+// size would change (an item whose axis kind or sizes changed, a projection
+// the header no longer has, a custom block of another count) is left as it
+// is: writing it would overwrite the blocks after it.
+
+namespace {
+
+// Rewrites the block at pos (the next block of edit). fill(block, old)
+// fills the new block from the header and returns false to leave the old
+// one as it is.
+template <class Fill>
+int32_t rewriteBlock(HeaderHandle header, FileHandle edit, int32_t tag, int64_t pos, Fill fill) {
+    InBlock old(header);
+    if (old.read(edit, 0, 0, __LINE__) != F_NO_ERROR) return old.status();
+    OutBlock block(header, old.first());
+    if (!fill(block, old.first()) || block.status() != F_NO_ERROR) return block.status();
+    if (!block.sameShape(old.first())) return F_NO_ERROR;  // its size would change: left as it is
+    seekTo(edit, pos);
+    return block.write(static_cast<uint16_t>(tag), edit, __LINE__);
+}
+
+// Brings the header's time-axis counters up to date (the number of time
+// steps written; for the non-equidistant kinds the span to the last time
+// written) and rewrites the time block at pos in the form the file holds.
+int32_t rewriteTimeBlock(HeaderHandle header, FileHandle edit, int32_t tag, int64_t pos) {
+    GrdTimeValues* v = grdTimeAxisValues(header);
+    const int32_t kind = timeKindOfTag(tag);
+    if (header->timeAxis.type != kind || v == nullptr) return report(header, edit, F_ERR_VALUE, __LINE__);
+    if (header->timeStepsDone > v->timeSteps) v->timeSteps = header->timeStepsDone;
+    if ((kind == F_TM_NEQ_AXIS || kind == F_CAL_NEQ_AXIS) && header->largestTime != F_DELETE_VALUE_DOUBLE)
+        v->step = header->largestTime - v->start;
+    return rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+        fillTimeBlock(header, tag, b);
+        return true;
+    });
+}
+
+// The custom block that the k-th 60000 block of a file stands for: the
+// k-th of the chain when it has the block's name (blocks of one name keep
+// their order), else the first of that name; null when none has it.
+const GrdCustomBlock* customBlockFor(const GrdHeader* h, int32_t k, const LrecNode* name) {
+    if (name == nullptr || name->type != RCF_BYTE) return nullptr;
+    const auto* bytes = static_cast<const char*>(name->data);
+    const void* zero = std::memchr(bytes, 0, name->count);
+    const size_t length = zero != nullptr ? static_cast<size_t>(static_cast<const char*>(zero) - bytes) : name->count;
+    const auto named = [&](const GrdCustomBlock* c) {
+        return c->name.length() == length && std::memcmp(c->name.orEmpty(), bytes, length) == 0;
+    };
+    const GrdCustomBlock* c = h->customBlocks.get();
+    for (int32_t i = 1; c != nullptr && i < k; ++i) c = c->next.get();
+    if (c != nullptr && named(c)) return c;
+    for (c = h->customBlocks.get(); c != nullptr; c = c->next.get())
+        if (named(c)) return c;
+    return nullptr;
+}
+
+// Whether an axis block as stored (its first record: the axis unit unless
+// older, then the sizes) holds the item's sizes.
+bool sameSizes(const GrdItem* item, bool older, const LrecNode* stored) {
+    const int32_t dirs = axisDirs(item->axisType);
+    const int32_t skip = older ? 0 : 1;
+    if (dirs + skip == 0) return true;
+    if (stored == nullptr || stored->type != RCF_INT4 || stored->count != static_cast<uint32_t>(dirs + skip)) return false;
+    for (int32_t d = 0; d < dirs; ++d)
+        if (valueAt<int32_t>(stored, static_cast<size_t>(skip + d)) != item->size[d]) return false;
+    return true;
+}
+
+bool isRewrittenField(int32_t tag) {
+    return tag == kTagFileTitle || tag == kTagAppTitle || tag == kTagAppVersion ||
+           (tag >= kTagDeleteFloat && tag <= kTagDataType);
+}
+
+// One full scan of the header blocks (grdUpdateHeader).
+int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, const GrdApiTrace& trace) {
+    int32_t itemNo = 0;    // the item of the last item block met (0: none yet)
+    int32_t customNo = 0;  // 60000 blocks met
+    for (;;) {
+        const int64_t pos = rcfTell64(edit);
+        const int32_t tag = FQueryLogicalBlock(edit);
+        if (tag == kTagStaticStart || tag == kTagDynamicStart) return F_NO_ERROR;
+        if (tag == 0) {
+            trace.print("Zero tag found, end of file, corrupt file");
+            return F_NO_ERROR;
+        }
+        if (tag == kTagItem || tag == kTagItemText) ++itemNo;
+        const GrdItem* item = grdHeaderItem(header, itemNo);
+        bool older = false;
+        int32_t status = F_NO_ERROR;
+        if (isRewrittenField(tag)) {
+            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+                // A projection that the header no longer has stays as it is.
+                return (tag != kTagProjection || header->geoInfoType == F_UTM_PROJECTION) &&
+                       fillHeaderField(header, tag, b);
+            });
+        } else if (isTimeTag(tag)) {
+            status = rewriteTimeBlock(header, edit, tag, pos);
+        } else if (item != nullptr && (tag == kTagItem || tag == kTagItemText)) {
+            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+                // An item whose unit changed between key and text needs the other block.
+                const bool unitAsText = tag == kTagItemText;
+                if (unitAsText != (item->unit < 0)) return false;
+                fillItemBlock(item, unitAsText, b);
+                return true;
+            });
+        } else if (item != nullptr && tag == kTagValueType) {
+            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+                b.value(RCF_INT4, item->valueType);
+                return true;
+            });
+        } else if (item != nullptr && axisTypeOfTag(tag, &older) != 0) {
+            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode* old) {
+                // Another axis kind or other sizes: the item's data on disk
+                // are laid out by the stored axis, which therefore stays.
+                if (axisTagOf(item->axisType, older) != tag || !sameSizes(item, older, old)) return false;
+                fillAxisBlock(header, item, older, b);
+                return true;
+            });
+        } else if (item != nullptr && tag == kTagElemStats) {
+            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+                fillStatsBlock(header, item, b);
+                return true;
+            });
+        } else if (tag == kTagCustomBlock) {
+            ++customNo;
+            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode* old) {
+                const GrdCustomBlock* c = customBlockFor(header, customNo, old);
+                if (c == nullptr) return false;
+                fillCustomBlock(c, b);
+                return true;
+            });
+        } else {
+            // Section starts, the item count, file type, statistics type,
+            // compressed flag, associations and whatever else is not ours.
+            status = FSkipLogicalBlock(edit);
+            trace.print("Unknown tag found %d", tag);
+        }
+        if (status != F_NO_ERROR) return status;
+    }
+}
+
+// One scan for the time block (grdUpdateHeaderTime).
+int32_t rewriteTimeOnly(HeaderHandle header, FileHandle edit, const GrdApiTrace& trace) {
+    for (;;) {
+        const int64_t pos = rcfTell64(edit);
+        const int32_t tag = FQueryLogicalBlock(edit);
+        if (isTimeTag(tag)) return rewriteTimeBlock(header, edit, tag, pos);
+        if (tag == kTagStaticStart || tag == kTagDynamicStart) return F_NO_ERROR;
+        if (tag == 0) {
+            trace.print("Zero tag found, end of file, corrupt file");
+            return F_NO_ERROR;
+        }
+        const int32_t status = FSkipLogicalBlock(edit);
+        trace.print("Unknown tag found %d", tag);
+        if (status != F_NO_ERROR) return status;
+    }
+}
+
+// The frame of both updates: checks, the one-second throttle, the flush,
+// the second handle positioned at appBase, the scan, and the close of the
+// second handle.
+template <class Scan>
+int32_t runUpdate(HeaderHandle header, int32_t force, FileHandle file, const GrdApiTrace& trace, Scan scan) {
+    int32_t status = grdCheckHeaderFile(header, file, kModule, __LINE__);
+    if (status != F_NO_ERROR) return status;
+    // Without force at most one rewrite a second: openClock holds the time
+    // of the file's last flush in monotonic milliseconds.
+    const uint32_t now = rcfClockMs();
+    if (force == 0 && static_cast<uint32_t>(now - file->openClock) / 1000.0 <= 1.0) return F_NO_ERROR;
+    if (file->readOnly != 0) return report(header, file, F_ERR_READONLY, __LINE__);
+    // Only a stream whose last transfer was a write holds bytes to flush.
+    if (file->stream != nullptr && file->lastOp < 0 && std::fflush(file->stream) != 0)
+        return report(header, file, F_ERR_FLUSH, __LINE__);
+    file->openClock = now;
+
+    // The second handle renews the edit stamp of the record-file header.
+    int32_t openStatus = F_NO_ERROR;
+    FileHandle edit = FOpenFileEdit(file->filname, &openStatus);
+    if (edit == nullptr) return openStatus != F_NO_ERROR ? openStatus : report(header, file, F_ERR_OPEN, __LINE__);
+    rcfSeekAppBase(edit);
+    status = rcfGetError(edit);
+    if (status != F_NO_ERROR) report(header, edit, status, __LINE__);
+    trace.print("while_loop starts here");
+    if (status == F_NO_ERROR) status = scan(edit);
+    trace.print("ends here");
+    // Closed in every case; a failed close counts when all else went well.
+    const int32_t closed = FCloseFile(&edit);
+    return status != F_NO_ERROR ? status : closed;
+}
+
+}  // namespace
+
+int32_t grdUpdateHeaderTime(HeaderHandle header, int32_t force, FileHandle file) {
+    GrdApiTrace trace("grdUpdateHeaderTime");
+    return trace.done(runUpdate(header, force, file, trace,
+                                [&](FileHandle edit) { return rewriteTimeOnly(header, edit, trace); }));
+}
+
+int32_t grdUpdateHeader(HeaderHandle header, int32_t force, FileHandle file) {
+    GrdApiTrace trace("grdUpdateHeader");
+    return trace.done(runUpdate(header, force, file, trace, [&](FileHandle edit) {
+        file->deleteValFloat = header->deleteValFloat;
+        file->deleteValDouble = header->deleteValDouble;
+        return rewriteHeaderBlocks(header, edit, trace);
+    }));
 }

@@ -277,9 +277,12 @@ inline void reverseBytes(std::vector<uint8_t>& b, size_t at, size_t n) {
     for (size_t i = 0; i < n / 2; ++i) std::swap(b[at + i], b[at + n - 1 - i]);
 }
 
-// A record file written in host order, rewritten record by record as a
-// machine of the opposite byte order would have written it.
+// A record file rewritten record by record into the opposite byte order:
+// a host-order file as a machine of the other order would have written it,
+// and such a file back into host order.
 inline std::vector<uint8_t> swapRecordFile(std::vector<uint8_t> b) {
+    if (b.size() < 8) return b;
+    const bool hostOrder = std::memcmp(b.data(), "QTA_", 4) == 0;
     reverseBytes(b, 0, 4);  // file tag
     reverseBytes(b, 4, 4);  // application tag
     size_t p = 8;
@@ -293,13 +296,17 @@ inline std::vector<uint8_t> swapRecordFile(std::vector<uint8_t> b) {
     while (p < b.size()) {
         const auto type = static_cast<int8_t>(b[p]);
         if (type > 0) {
+            if (p + 5 > b.size()) break;
             uint32_t count = 0;
-            std::memcpy(&count, &b[p + 1], 4);
+            if (hostOrder) std::memcpy(&count, &b[p + 1], 4);
             reverseBytes(b, p + 1, 4);
+            if (!hostOrder) std::memcpy(&count, &b[p + 1], 4);
             const size_t size = rcfSimpSize(type);
             p += 5;
+            if (size * count > b.size() - p) break;
             for (uint32_t i = 0; i < count; ++i, p += size) reverseBytes(b, p, size);
         } else if (b[p] == 0xFE) {
+            if (p + 3 > b.size()) break;
             reverseBytes(b, p + 1, 2);
             p += 3;
         } else {

@@ -309,13 +309,17 @@ TEST_F(LifecycleTest, FlushThrottle) {
     ASSERT_EQ(grdStaticWrite(item.get(), file_, &one), 0);
     ASSERT_EQ(std::fflush(file_->stream), 0);
 
-    header_->timeStepsDone = 2;  // no force: created just now, so nothing is rewritten
+    // "Just flushed" is made exact by setting the time of the last flush.
+    const auto flushedNow = [&] { file_->openClock = rcfClockMs(); };
+    header_->timeStepsDone = 2;  // no force, flushed just now: nothing is rewritten
+    flushedNow();
     EXPECT_EQ(grdFileFlushTimeStep(header_, file_), 0);
     EXPECT_EQ(timeStepsOnDisk(path), 0);
     header_->timeStepsDone = 1;  // forced
     EXPECT_EQ(grdFileFlushTimeStep(header_, file_), 0);
     EXPECT_EQ(timeStepsOnDisk(path), 1);
     header_->timeStepsDone = 3;
+    flushedNow();
     EXPECT_EQ(grdFileFlushTimeStep(header_, file_), 0);
     EXPECT_EQ(timeStepsOnDisk(path), 1);
     file_->openClock -= 2000;  // more than a second ago
@@ -323,10 +327,12 @@ TEST_F(LifecycleTest, FlushThrottle) {
     EXPECT_EQ(timeStepsOnDisk(path), 3);
 
     ASSERT_EQ(grdSetFileTitle(header_, "bbbb"), 0);
-    EXPECT_EQ(grdFileFlush(header_, file_), 0);  // flushed just now
+    flushedNow();
+    EXPECT_EQ(grdFileFlush(header_, file_), 0);
     EXPECT_EQ(titleOnDisk(path), "aaaa");
     header_->timeStepsDone = 1;
     header_->nextItem = 1;  // inside a time step: no force either
+    flushedNow();
     EXPECT_EQ(grdFileFlush(header_, file_), 0);
     EXPECT_EQ(titleOnDisk(path), "aaaa");
     header_->nextItem = 0;

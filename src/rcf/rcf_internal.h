@@ -47,6 +47,10 @@ struct RcfFile {
     // seen so far, refreshed on demand to bound what a record may claim.
     std::unique_ptr<char[]> ioBuffer;
     int64_t knownSize = 0;
+    // For the gridded-data layer: the offset just after the block that starts
+    // the dynamic data, once it has been written or found (-1 before). It
+    // never moves while the file is open, so positioning can go there at once.
+    int64_t dynamicStart = -1;
 
     RcfFile() = default;
     RcfFile(const RcfFile&) = delete;

@@ -142,6 +142,7 @@ int32_t walkToTimeStep(GrdHeader* header, FileHandle file, int32_t t) {
 // reached by walking the records instead, so a search never ends mid-record.
 int32_t forwardToTimeStep(GrdHeader* header, FileHandle file, int32_t t) {
     int32_t status = F_NO_ERROR;
+    int64_t measured = 0;
     if (t - header->timeStepsDone < kJumpSteps) {
         for (int32_t d = t - header->timeStepsDone; d > 0 && status == F_NO_ERROR; --d)
             status = grdSkipTimeStep(header, file);
@@ -156,12 +157,31 @@ int32_t forwardToTimeStep(GrdHeader* header, FileHandle file, int32_t t) {
             if (before >= 0 && length > 0 && length <= (INT64_MAX - after) / remaining) {
                 grdSeekTo(file, after + remaining * length);
                 header->timeStepsDone = t;
+                measured = length;
             } else {
                 status = F_ERR_SEEK;  // no such position: walk
             }
         }
     }
-    if (status == F_NO_ERROR && timeStepStartsHere(header, file)) return F_NO_ERROR;
+    if (status == F_NO_ERROR && timeStepStartsHere(header, file)) {
+        if (measured > 0) file->timeStepLength = measured;
+        return F_NO_ERROR;
+    }
+    if (file->error > F_EOF) return takeError(header, file, __LINE__);
+    return walkToTimeStep(header, file, t);
+}
+
+// Once the start of the dynamic data and the length of a time step are
+// known, every time step is one jump from the start (checked on arrival
+// like any jump).
+int32_t jumpFromStart(GrdHeader* header, FileHandle file, int32_t t) {
+    grdSeekTo(file, file->dynamicStart + t * file->timeStepLength);
+    if (file->error == F_NO_ERROR && timeStepStartsHere(header, file)) {
+        file->ownerMark = kSectionDynamic;
+        header->timeStepsDone = t;
+        header->nextItem = 0;
+        return F_NO_ERROR;
+    }
     if (file->error > F_EOF) return takeError(header, file, __LINE__);
     return walkToTimeStep(header, file, t);
 }
@@ -169,8 +189,13 @@ int32_t forwardToTimeStep(GrdHeader* header, FileHandle file, int32_t t) {
 // Positions at time step t, item 1 (t already checked).
 int32_t gotoTimeStep(GrdHeader* header, FileHandle file, int32_t t) {
     const bool inDynamic = file->ownerMark >= kSectionDynamic;
-    if (inDynamic && header->timeStepsDone == t && header->nextItem == 0) return F_NO_ERROR;
-    if (!inDynamic || header->timeStepsDone >= t) {
+    const int32_t done = header->timeStepsDone;
+    if (inDynamic && done == t && header->nextItem == 0) return F_NO_ERROR;
+    const bool shortForward = inDynamic && done < t && t - done < kJumpSteps;
+    if (!shortForward && file->dynamicStart >= 0 && file->timeStepLength > 0 &&
+        t <= (INT64_MAX - file->dynamicStart) / file->timeStepLength)
+        return jumpFromStart(header, file, t);
+    if (!inDynamic || done >= t) {
         const int32_t status = grdFindBlockDynamic(header, file);
         if (status != F_NO_ERROR) return status;
     }

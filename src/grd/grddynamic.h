@@ -39,5 +39,6 @@ double grdConvertItemValue(const GrdHeader* header, const GrdItem* item, double 
 
 // Statistics update of item itemNo (1-based) with its used elements as
 // written (converted into the item's unit, gathered when compressed).
-// Traced "grdCalcStatistics %d".
+// Traced "grdCalcStatistics %d"; 2010 for an unknown statistics type (the
+// global extremes are kept all the same).
 int32_t grdCalcStatistics(GrdHeader* header, int32_t itemNo, const void* values);

@@ -5,83 +5,33 @@
 // lag-one sums of its autocorrelation (a delete value breaks the chain).
 // The update is on the write path: it switches on the data type once per
 // call, and the global-only pass is a plain extremes scan.
+#include <algorithm>
 #include <cmath>
-#include <cstring>
 #include <limits>
+#include <type_traits>
 
 #include "common/capi.h"
 #include "grd/grddynamic.h"
+#include "grd/grdextremes.h"
 #include "grd/grdio.h"
 
 namespace {
 
 constexpr const char* kModule = kModGrdItemStats;
 
-// Extremes and delete count of one pass over an item's values.
-struct Extremes {
-    double min;
-    double max;
-    int64_t values;   // ordinary values
-    int64_t deletes;  // delete values
-};
-
-// Global statistics only: extremes over the values that are not the delete
-// value. Eight independent lanes keep the loop free of carried dependencies
-// so that the compiler can vectorise it; comparisons stay in the values' own
-// type and only the results are widened.
+// The global pass of one data type.
 template <class T>
-Extremes scanExtremes(const T* p, int64_t n, T del, bool hasDelete) {
-    constexpr int kLanes = 8;
-    T lo[kLanes];
-    T hi[kLanes];
-    int64_t deletes[kLanes];
-    for (int j = 0; j < kLanes; ++j) {
-        lo[j] = std::numeric_limits<T>::has_infinity ? std::numeric_limits<T>::infinity()
-                                                     : std::numeric_limits<T>::max();
-        hi[j] = std::numeric_limits<T>::has_infinity ? -std::numeric_limits<T>::infinity()
-                                                     : std::numeric_limits<T>::lowest();
-        deletes[j] = 0;
-    }
-    int64_t i = 0;
-    if (hasDelete) {
-        for (; i + kLanes <= n; i += kLanes) {
-            for (int j = 0; j < kLanes; ++j) {
-                const T v = p[i + j];
-                const bool isDelete = v == del;
-                deletes[j] += isDelete;
-                lo[j] = (!isDelete && v < lo[j]) ? v : lo[j];
-                hi[j] = (!isDelete && v > hi[j]) ? v : hi[j];
-            }
-        }
+GrdExtremes scanGlobal(const T* p, int64_t n, T del, bool hasDelete) {
+    if constexpr (std::is_same_v<T, float> || std::is_same_v<T, double>) {
+        return grdScanExtremes(p, n, del);
     } else {
-        for (; i + kLanes <= n; i += kLanes) {
-            for (int j = 0; j < kLanes; ++j) {
-                const T v = p[i + j];
-                lo[j] = v < lo[j] ? v : lo[j];
-                hi[j] = v > hi[j] ? v : hi[j];
-            }
-        }
+        return grdScanExtremesScalar(p, n, del, hasDelete);
     }
-    for (; i < n; ++i) {
-        const T v = p[i];
-        const bool isDelete = hasDelete && v == del;
-        deletes[0] += isDelete;
-        lo[0] = (!isDelete && v < lo[0]) ? v : lo[0];
-        hi[0] = (!isDelete && v > hi[0]) ? v : hi[0];
-    }
-    Extremes e{static_cast<double>(lo[0]), static_cast<double>(hi[0]), 0, deletes[0]};
-    for (int j = 1; j < kLanes; ++j) {
-        e.min = std::fmin(e.min, static_cast<double>(lo[j]));
-        e.max = std::fmax(e.max, static_cast<double>(hi[j]));
-        e.deletes += deletes[j];
-    }
-    e.values = n - e.deletes;
-    return e;
 }
 
 // Merges a pass's extremes into the item's: a stored extreme that is still the
 // double delete value (none yet) is replaced, otherwise the wider one is kept.
-void mergeGlobal(GrdItem* item, const Extremes& e, double del) {
+void mergeGlobal(GrdItem* item, const GrdExtremes& e, double del) {
     item->globalDeletes += static_cast<double>(e.deletes);
     if (e.values == 0) return;
     if (item->globalMax == del || item->globalMax <= e.max) item->globalMax = e.max;
@@ -91,8 +41,8 @@ void mergeGlobal(GrdItem* item, const Extremes& e, double del) {
 // Per-element statistics of the first n elements, together with the global
 // extremes. A delete value counts and breaks the element's lag-one chain.
 template <class T>
-Extremes updateElements(const T* p, int64_t n, T delT, bool hasDelete, GrdElementStats* stats, double del) {
-    Extremes e{std::numeric_limits<double>::infinity(), -std::numeric_limits<double>::infinity(), 0, 0};
+GrdExtremes updateElements(const T* p, int64_t n, T delT, bool hasDelete, GrdElementStats* stats, double del) {
+    GrdExtremes e{std::numeric_limits<double>::infinity(), -std::numeric_limits<double>::infinity(), 0, 0};
     for (int64_t i = 0; i < n; ++i) {
         GrdElementStats& s = stats[i];
         const T v = p[i];
@@ -120,39 +70,22 @@ Extremes updateElements(const T* p, int64_t n, T delT, bool hasDelete, GrdElemen
     return e;
 }
 
-// One update over n values of type T; stats is null for global statistics
-// only, else holds the first nStats element records.
+// One update over the n values of type T; stats is null for global
+// statistics only, else holds the records of the first nStats elements.
 template <class T>
 void updateTyped(GrdItem* item, const void* data, int64_t n, T delT, bool hasDelete, GrdElementStats* stats,
                  int64_t nStats, double del) {
     const T* p = static_cast<const T*>(data);
-    if (stats == nullptr) {
-        mergeGlobal(item, scanExtremes(p, n, delT, hasDelete), del);
-        return;
-    }
+    const int64_t withRecords = stats == nullptr ? 0 : std::clamp<int64_t>(nStats, 0, n);
+    if (withRecords > 0) mergeGlobal(item, updateElements(p, withRecords, delT, hasDelete, stats, del), del);
     // Elements beyond the records (never the case for a consistent header)
     // still count for the global statistics.
-    const int64_t withRecords = nStats < n ? nStats : n;
-    mergeGlobal(item, updateElements(p, withRecords, delT, hasDelete, stats, del), del);
-    if (withRecords < n) mergeGlobal(item, scanExtremes(p + withRecords, n - withRecords, delT, hasDelete), del);
+    if (withRecords < n) mergeGlobal(item, scanGlobal(p + withRecords, n - withRecords, delT, hasDelete), del);
 }
 
-void update(const GrdHeader* h, GrdItem* item, const void* data, int64_t n, GrdElementStats* stats, int64_t nStats) {
-    const double del = h->deleteValDouble;
-    switch (item->dataType) {
-        case RCF_FLOAT: updateTyped<float>(item, data, n, h->deleteValFloat, true, stats, nStats, del); break;
-        case RCF_DOUBLE: updateTyped<double>(item, data, n, del, true, stats, nStats, del); break;
-        // A byte is taken as a signed 8-bit value, like its delete value.
-        case RCF_BYTE:
-            updateTyped<int8_t>(item, data, n, static_cast<int8_t>(h->deleteValByte), true, stats, nStats, del);
-            break;
-        case RCF_INT4: updateTyped<int32_t>(item, data, n, h->deleteValInt, true, stats, nStats, del); break;
-        case RCF_UINT4: updateTyped<uint32_t>(item, data, n, h->deleteValUnsignedInt, true, stats, nStats, del); break;
-        // The 16-bit types have no delete value: every value counts.
-        case RCF_INT2: updateTyped<int16_t>(item, data, n, 0, false, stats, nStats, del); break;
-        case RCF_UINT2: updateTyped<uint16_t>(item, data, n, 0, false, stats, nStats, del); break;
-        default: break;
-    }
+// Whether the header's statistics type keeps per-element records.
+bool perElement(const GrdHeader* h) {
+    return h->statsType == F_ITEM_STATS_ELEMENT || h->statsType == F_ITEM_STATS_ELEMENT_ALT;
 }
 
 // A count kept as a double, as an integer (a damaged file may hold anything).
@@ -162,28 +95,54 @@ int32_t countOf(double count) {
     return v >= 2147483647.0 ? std::numeric_limits<int32_t>::max() : static_cast<int32_t>(v);
 }
 
-}  // namespace
-
-int32_t grdCalcStatistics(GrdHeader* header, int32_t itemNo, const void* values) {
-    GrdApiTrace trace("grdCalcStatistics %d", itemNo);
-    int32_t status = grdCheckHeaderItemNo(header, itemNo, kModule, __LINE__);
-    if (status != F_NO_ERROR) return trace.done(status);
-    GrdItem* item = &header->items[itemNo - 1];
-    const int64_t n = grdItemUsedElementCount(item);
-    if (n <= 0 || values == nullptr) {
-        trace.print("F_NO_ERROR = OK");
-        return trace.done(F_NO_ERROR);
+// The update with the item's n used elements, switched once on the data type.
+void update(const GrdHeader* h, GrdItem* item, const void* values, int64_t n) {
+    // An item whose records were not made (memory) keeps global statistics.
+    GrdElementStats* stats = perElement(h) ? item->elemStats.get() : nullptr;
+    const int64_t nStats = stats != nullptr ? item->elemStatsCount : 0;
+    const double del = h->deleteValDouble;
+    switch (item->dataType) {
+        case RCF_FLOAT: updateTyped<float>(item, values, n, h->deleteValFloat, true, stats, nStats, del); break;
+        case RCF_DOUBLE: updateTyped<double>(item, values, n, del, true, stats, nStats, del); break;
+        // A byte is taken as a signed 8-bit value, like its delete value.
+        case RCF_BYTE:
+            updateTyped<int8_t>(item, values, n, static_cast<int8_t>(h->deleteValByte), true, stats, nStats, del);
+            break;
+        case RCF_INT4: updateTyped<int32_t>(item, values, n, h->deleteValInt, true, stats, nStats, del); break;
+        case RCF_UINT4:
+            updateTyped<uint32_t>(item, values, n, h->deleteValUnsignedInt, true, stats, nStats, del);
+            break;
+        // The 16-bit types have no delete value: every value counts.
+        case RCF_INT2: updateTyped<int16_t>(item, values, n, 0, false, stats, nStats, del); break;
+        case RCF_UINT2: updateTyped<uint16_t>(item, values, n, 0, false, stats, nStats, del); break;
+        default: break;
     }
-    GrdElementStats* stats = nullptr;
-    if (header->statsType == F_ITEM_STATS_ELEMENT || header->statsType == F_ITEM_STATS_ELEMENT_ALT) {
-        stats = item->elemStats.get();
-    } else if (header->statsType != F_ITEM_STATS_GLOBAL) {
+}
+
+// The checks of the update, with its trace lines: 2010 for an unknown
+// statistics type.
+int32_t checkUpdate(GrdHeader* header, int32_t itemNo, const GrdApiTrace& trace) {
+    int32_t status = grdCheckHeaderItemNo(header, itemNo, kModule, __LINE__);
+    if (status != F_NO_ERROR) return status;
+    if (grdItemUsedElementCount(&header->items[itemNo - 1]) <= 0) {
+        trace.print("F_NO_ERROR = OK");
+    } else if (!perElement(header) && header->statsType != F_ITEM_STATS_GLOBAL) {
         // An unknown statistics type keeps the global extremes only.
         trace.print("F_ERR_DATA");
         status = grdReportError(header, nullptr, 0, F_ERR_VALUE, kModule, __LINE__);
     }
-    // An item whose records were not made (memory) keeps global statistics.
-    update(header, item, values, n, stats, stats != nullptr ? item->elemStatsCount : 0);
+    return status;
+}
+
+}  // namespace
+
+int32_t grdCalcStatistics(GrdHeader* header, int32_t itemNo, const void* values) {
+    GrdApiTrace trace("grdCalcStatistics %d", itemNo);
+    const int32_t status = checkUpdate(header, itemNo, trace);
+    if (status != F_NO_ERROR && status != F_ERR_VALUE) return trace.done(status);
+    GrdItem* item = &header->items[itemNo - 1];
+    const int64_t n = grdItemUsedElementCount(item);
+    if (n > 0 && values != nullptr) update(header, item, values, n);
     return trace.done(status);
 }
 
@@ -241,3 +200,4 @@ int32_t TOVA_CALL grdGetItemStatsGlobal(ItemHandle item, double* minimum, double
 }
 
 }  // extern "C"
+

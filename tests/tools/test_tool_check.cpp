@@ -31,10 +31,18 @@ Bytes concat(std::initializer_list<Bytes> parts) {
     return all;
 }
 
-// A record file of no known application whose body is the given bytes.
-void writeRawFile(const std::string& path, Bytes body, const char* appText = "") {
+uint32_t xfsIdent(uint32_t* version) {
+    *version = 106;
+    uint32_t tag = 0;
+    std::memcpy(&tag, "XFS_", 4);
+    return tag;
+}
+
+// A record file whose body is the given bytes: of no known application, or
+// with the given application callback.
+void writeRawFile(const std::string& path, Bytes body, const char* appText = "", rcfAppIdent app = nullptr) {
     FileHandle f = nullptr;
-    ASSERT_EQ(rcfFileOpenCreate(path.c_str(), appText, &f, nullptr, 0), 0);
+    ASSERT_EQ(rcfFileOpenCreate(path.c_str(), appText, &f, app, 0), 0);
     if (!body.empty()) rcfWriteRaw(body.data(), 1, static_cast<uint32_t>(body.size()), f);
     ASSERT_EQ(rcfFileClose(&f), 0);
 }
@@ -61,11 +69,13 @@ TEST(ToolCheck, SoundFilesPassWithTheirCounts) {
     const std::string vre = dir.file("a.vre");
     const std::string grd = dir.file("a.grd");
     const std::string raw = dir.file("a.rcf");
+    const std::string xfs = dir.file("a.xfs");
+    tooltest::writeXsecFile(xfs);
     tooltest::writeVreFile(vre);
     tooltest::writeGridLikeFile(grd);
     writeRawFile(raw, concat({record(1, 3, 4), blockStart(7), record(2, 1, 8), {0xFF}, blockStart(8), {0xFF}}));
 
-    for (const std::string& path : {vre, grd, raw}) {
+    for (const std::string& path : {vre, grd, raw, xfs}) {
         const tooltest::Run run = runTova({"check", path});
         EXPECT_EQ(run.exitCode, 0) << path << "\n" << run.out << run.err;
         EXPECT_TRUE(endsWith(run.out, okLine(tooltest::walkLayout(path), testutil::readBytes(path).size())))
@@ -186,6 +196,42 @@ TEST(ToolCheck, VreRecordsMustFollowTheirSequence) {
     EXPECT_NE(run.out.find("records follow the end"), std::string::npos) << run.out;
 }
 
+TEST(ToolCheck, CrossSectionBlocksMustHoldWhatTheirTagSays) {
+    testutil::TempDir dir;
+    const std::string path = dir.file("x.xfs");
+    const Bytes key = concat({blockStart(257), record(3, 5, 1), record(2, 1, 8), record(3, 4, 1), {0xFF}});
+    const Bytes header = concat({blockStart(258), record(7, 25, 2), record(2, 23, 8), {0xFF}});
+    ASSERT_EQ(key.size(), 36u);
+    ASSERT_EQ(header.size(), 248u);
+    struct Case {
+        Bytes bytes;
+        int64_t offset;
+        const char* phrase;
+    };
+    const std::vector<Case> cases = {
+        {concat({blockStart(260), record(2, 1, 8), {0xFF}}), 0, "a selection block outside any cross section"},
+        {concat({key, key, header}), 0, "a key block without a header block"},
+        {concat({key, header, key}), 284, "the last key block has no header block"},
+        {concat({key, header, record(4, 1, 4)}), 284, "an integer*4 record of 1 element outside any block"},
+        {concat({key, header, blockStart(300), {0xFF}}), 284, "block 300 is no block of cross-section files"},
+        {concat({key, blockStart(258), record(7, 20, 2), record(2, 23, 8), {0xFF}}), 39,
+         "20 header words, format version 106 has 25"},
+        {concat({key, header, blockStart(262), record(2, 2, 8), record(2, 2, 8), record(2, 3, 8), {0xFF}}), 284 + 45,
+         "its columns differ in length (3 and 2)"},
+        {concat({key, header, blockStart(259), record(2, 1, 8), record(2, 1, 8), {0xFF}}), 284,
+         "the raw-point block holds 2 records, 6 are due"},
+    };
+    for (const Case& c : cases) {
+        writeRawFile(path, c.bytes, "", xfsIdent);
+        const tooltest::Run run = runTova({"check", path});
+        EXPECT_EQ(run.exitCode, 1) << c.phrase << "\n" << run.out;
+        EXPECT_EQ(damagedOffset(run), 113 + c.offset) << c.phrase << "\n" << run.out;
+        EXPECT_NE(run.out.find(c.phrase), std::string::npos) << run.out;
+    }
+    writeRawFile(path, concat({key, header}), "", xfsIdent);
+    EXPECT_EQ(runTova({"check", path}).exitCode, 0);
+}
+
 namespace {
 
 // Truncations to every length below the size, sampled beyond the first 256.
@@ -209,10 +255,11 @@ bool fixedHeader(const tooltest::Layout& layout, uint64_t offset) {
            (offset >= layout.rcfBase + 40u && offset < layout.appBase);
 }
 
-// Cuts and bit flips of a sound file. strict: the kind's rules leave no cut
-// and no flip of a record header unseen (else cuts at a top-level boundary
-// and flips that give another record type of the same size may pass).
-void checkDamagedCopies(const std::string& good, bool strict) {
+// Cuts and bit flips of a sound file. strictCuts: every cut is damage (else
+// a cut at a top-level boundary leaves a sound file). strictFlips: the kind's
+// rules see every flip in a record header (else flips that give another
+// record type of the same size, or another block identifier, may pass).
+void checkDamagedCopies(const std::string& good, bool strictCuts, bool strictFlips) {
     const Bytes bytes = testutil::readBytes(good);
     const tooltest::Layout layout = tooltest::walkLayout(good);
     const std::set<int64_t> boundaries(layout.boundaries.begin(), layout.boundaries.end());
@@ -222,7 +269,7 @@ void checkDamagedCopies(const std::string& good, bool strict) {
         testutil::writeBytes(copy, Bytes(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(n)));
         const tooltest::Run run = runTova({"check", copy});
         ASSERT_TRUE(run.clean()) << "cut to " << n << ": " << run.exitCode << " " << run.signal << "\n" << run.err;
-        if (strict || boundaries.count(static_cast<int64_t>(n)) == 0) {
+        if (strictCuts || boundaries.count(static_cast<int64_t>(n)) == 0) {
             EXPECT_EQ(run.exitCode, 1) << "cut to " << n << "\n" << run.out;
         }
     }
@@ -236,7 +283,7 @@ void checkDamagedCopies(const std::string& good, bool strict) {
         ASSERT_TRUE(run.clean()) << "flip at " << offset << ": " << run.exitCode << " " << run.signal << "\n"
                                  << run.err;
         EXPECT_LE(run.exitCode, 1) << "flip at " << offset;
-        if (fixedHeader(layout, offset) || (strict && inHeader(layout, offset))) {
+        if (fixedHeader(layout, offset) || (strictFlips && inHeader(layout, offset))) {
             EXPECT_EQ(run.exitCode, 1) << "flip at " << offset << "\n" << run.out;
         }
     }
@@ -247,13 +294,19 @@ void checkDamagedCopies(const std::string& good, bool strict) {
 TEST(ToolCheck, TruncatedAndBitFlippedVreFilesFailWithoutCrashing) {
     testutil::TempDir dir;
     tooltest::writeVreFile(dir.file("a.vre"));
-    checkDamagedCopies(dir.file("a.vre"), true);
+    checkDamagedCopies(dir.file("a.vre"), true, true);
 }
 
 TEST(ToolCheck, TruncatedAndBitFlippedGridFilesFailWithoutCrashing) {
     testutil::TempDir dir;
     tooltest::writeGridLikeFile(dir.file("a.grd"));
-    checkDamagedCopies(dir.file("a.grd"), false);
+    checkDamagedCopies(dir.file("a.grd"), false, false);
+}
+
+TEST(ToolCheck, TruncatedAndBitFlippedCrossSectionFilesFailWithoutCrashing) {
+    testutil::TempDir dir;
+    tooltest::writeXsecFile(dir.file("a.xfs"));
+    checkDamagedCopies(dir.file("a.xfs"), false, true);
 }
 
 TEST(ToolCheck, RandomBodiesNeverCrashTheTool) {

@@ -11,6 +11,7 @@
 #include "rcf/rcf_internal.h"
 #include "tool_test.h"
 #include "tova/vre.h"
+#include "tova/xfs.h"
 
 using tooltest::runTova;
 
@@ -137,6 +138,50 @@ TEST(ToolInfo, VreFileAsJsonSaysWhatTheLibraryReads) {
 
     // The text form shows the same name with the odd bytes escaped.
     EXPECT_NE(runTova({"info", path}).out.find("  1  h\\xe9ll\"o\\x0a       2\n"), std::string::npos);
+}
+
+TEST(ToolInfo, CrossSectionFileAsTextAndJson) {
+    testutil::TempDir dir;
+    const std::string path = dir.file("a.xfs");
+    tooltest::writeXsecFile(path);
+    const tooltest::Run run = runTova({"info", path});
+    ASSERT_EQ(run.exitCode, 0) << run.err;
+    const std::string text = masked(run.out, path);
+    EXPECT_NE(text.find("kind            xfs\n"), std::string::npos) << text;
+    EXPECT_NE(text.find("applicationCreated  106\n"), std::string::npos) << text;
+    EXPECT_NE(text.find(R"(xfs:
+  formatVersion  106
+  count          3
+  sections:
+    primary  secondary    key  extra        raw  selection  processed  coordinates
+    Canal                   0                 0          0          0            0
+    River A  left       100.5  survey 2019    3          2          0            0
+    River A  left         250                 0          0          2            2
+)"),
+              std::string::npos)
+        << text;
+
+    const nlohmann::json doc = infoJson(path);
+    XsecTableHandle table = nullptr;
+    ASSERT_EQ(xfsXsecTableLoad(path.c_str(), &table, 0), 0);
+    EXPECT_EQ(doc["xfs"]["formatVersion"], xfsXsecTableVersion(table));
+    ASSERT_EQ(doc["xfs"]["count"], 3);
+    XsecCursor cursor = nullptr;
+    XsecHandle x = xfsXsecFind(table, "", 0.0, "", &cursor);
+    for (const nlohmann::json& row : doc["xfs"]["sections"]) {
+        ASSERT_NE(x, nullptr);
+        EXPECT_EQ(row["primary"], x->primaryName);
+        EXPECT_EQ(row["secondary"], x->secondaryName);
+        EXPECT_EQ(row["extra"], x->extraName);
+        EXPECT_EQ(row["key"].get<double>(), x->keyValue);
+        EXPECT_EQ(row["raw"], x->noRaw);
+        EXPECT_EQ(row["selection"], x->noSel);
+        EXPECT_EQ(row["processed"], x->noPrc);
+        EXPECT_EQ(row["coordinates"], x->noCoords);
+        x = xfsXsecFindNext(table, cursor);
+    }
+    EXPECT_EQ(x, nullptr);
+    xfsXsecTableFree(&table);
 }
 
 TEST(ToolInfo, GriddedUnknownAndForeignOrderFilesShowTheirRecordFileHeader) {

@@ -16,6 +16,7 @@
 #include "rcf/rcf_internal.h"
 #include "tova/rcf.h"
 #include "tova/vre.h"
+#include "tova/xfs.h"
 
 extern char** environ;
 
@@ -143,6 +144,30 @@ void writeVreFile(const std::string& path, const std::string& firstBodyName) {
         vreSetVectorItem(h.get(), k, values.data());
     }
     if (vreFileWrite(path.c_str(), h.get()) != 0) throw std::runtime_error("cannot write the VRE file");
+}
+
+void writeXsecFile(const std::string& path) {
+    FileHandle f = nullptr;
+    if (xfsFileOpenCreate(path.c_str(), &f) != 0) throw std::runtime_error("cannot create the file");
+    const auto write = [&](XsecHandle x) {
+        if (x == nullptr || xfsXsecWrite(x, f) != 0) throw std::runtime_error("cannot write a cross section");
+        xfsXsecFree(&x);
+    };
+    XsecHandle x = xfsXsecCreate("River A", 250.0, "left");
+    xfsXsecSetNoPrc(x, 2);
+    xfsXsecSetNoCoords(x, 2);
+    for (int c = 0; c < 6; ++c) x->prc[c][1] = c;
+    x->coords[2][0] = 12.5;
+    write(x);
+    write(xfsXsecCreate("Canal", 0.0, ""));
+    x = xfsXsecCreateEx("River A", 100.5, "left", "survey 2019");
+    xfsXsecSetNoRaw(x, 3);
+    xfsXsecSetNoSel(x, 2);
+    for (int i = 0; i < 3; ++i) x->raw[0][i] = i;
+    x->rawMark[1][2] = 7;
+    x->sel[1] = 2;
+    write(x);
+    if (xfsFileClose(&f) != 0) throw std::runtime_error("cannot close the file");
 }
 
 void writeGridLikeFile(const std::string& path) {

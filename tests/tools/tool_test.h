@@ -42,6 +42,12 @@ Layout walkLayout(const std::string& path);
 // The first body's name is given.
 void writeVreFile(const std::string& path, const std::string& firstBodyName = "hull");
 
+// A cross-section file of three cross sections, written out of key order:
+// ("River A", 250, "left") with 2 processed rows and 2 coordinates, ("Canal",
+// 0, "") with no data, ("River A", 100.5, "left", extra "survey 2019") with
+// 3 raw points and 2 selection values.
+void writeXsecFile(const std::string& path);
+
 // A record file of the gridded-data application ("GRD_") with a few header
 // blocks, a static section and two time steps, written through the
 // logical-block layer.

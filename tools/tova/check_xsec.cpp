@@ -10,6 +10,7 @@
 
 #include "check.h"
 #include "tova/rcf.h"
+#include "xsec_table.h"
 
 namespace tova_cli {
 
@@ -71,6 +72,17 @@ public:
 
     std::optional<Problem> finish() override {
         if (keyPending_) return Problem{key_.offset, "the last key block has no header block"};
+        // The loader must accept the file and make every cross section valid.
+        int32_t status = 0;
+        const XsecTablePtr table = loadXsecTable(info_.path, &status);
+        if (status != F_NO_ERROR || !table) {
+            return Problem{info_.appBase, "the cross-section loader refuses the file: status " + statusText(status)};
+        }
+        const size_t valid = walkXsecTable(table.get()).size();
+        if (valid != sections_) {
+            return Problem{info_.appBase, "the cross-section loader makes " + std::to_string(valid) + " of the " +
+                                              std::to_string(sections_) + " cross sections valid"};
+        }
         return std::nullopt;
     }
 
@@ -107,7 +119,8 @@ private:
 
     std::optional<Problem> wrongCount(const std::string& due) const {
         return Problem{block_.offset, std::string("the ") + blockName(block_.count) + " holds " +
-                                          std::to_string(records_) + " records, " + due};
+                                          std::to_string(records_) + (records_ == 1 ? " record, " : " records, ") +
+                                          due};
     }
 
     // A data set: columns of equal length, of the given types.

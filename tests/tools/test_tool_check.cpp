@@ -234,11 +234,32 @@ TEST(ToolCheck, CrossSectionBlocksMustHoldWhatTheirTagSays) {
 
 namespace {
 
-// Truncations to every length below the size, sampled beyond the first 256.
-std::vector<uint64_t> cutLengths(uint64_t size) {
-    std::vector<uint64_t> lengths;
-    for (uint64_t n = 0; n < size; n += n < 256 ? 1 : 7) lengths.push_back(n);
-    return lengths;
+// Lengths to cut a sound file to: samples of the file header, every length
+// near the start of the body and within each record header, and a stride
+// over the rest (each run of the tool is a process start, slow when
+// sanitized).
+std::vector<uint64_t> cutLengths(const tooltest::Layout& layout, uint64_t size) {
+    std::set<uint64_t> lengths;
+    for (uint64_t n = 0; n < layout.appBase; n += 5) lengths.insert(n);
+    for (uint64_t n = layout.appBase; n < size && n < layout.appBase + 48u; ++n) lengths.insert(n);
+    for (uint64_t n = layout.appBase; n < size; n += 13) lengths.insert(n);
+    for (const auto& [begin, end] : layout.headers) {
+        if (end - begin > 1) lengths.insert(static_cast<uint64_t>(begin) + 1);
+    }
+    return {lengths.begin(), lengths.end()};
+}
+
+// Offsets of bytes to flip: samples of the file header, the type byte and
+// one other byte of every record header, and a stride over the data.
+std::vector<uint64_t> flipOffsets(const tooltest::Layout& layout, uint64_t size, std::mt19937& random) {
+    std::set<uint64_t> offsets;
+    for (uint64_t n = 0; n < layout.appBase; n += 3) offsets.insert(n);
+    for (const auto& [begin, end] : layout.headers) {
+        offsets.insert(static_cast<uint64_t>(begin));
+        if (end - begin > 1) offsets.insert(static_cast<uint64_t>(begin) + 1 + random() % (end - begin - 1));
+    }
+    for (uint64_t n = layout.appBase; n < size; n += 17) offsets.insert(n);
+    return {offsets.begin(), offsets.end()};
 }
 
 bool inHeader(const tooltest::Layout& layout, uint64_t offset) {
@@ -265,7 +286,7 @@ void checkDamagedCopies(const std::string& good, bool strictCuts, bool strictFli
     const std::set<int64_t> boundaries(layout.boundaries.begin(), layout.boundaries.end());
     const std::string copy = good + ".damaged";
 
-    for (uint64_t n : cutLengths(bytes.size())) {
+    for (uint64_t n : cutLengths(layout, bytes.size())) {
         testutil::writeBytes(copy, Bytes(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(n)));
         const tooltest::Run run = runTova({"check", copy});
         ASSERT_TRUE(run.clean()) << "cut to " << n << ": " << run.exitCode << " " << run.signal << "\n" << run.err;
@@ -275,7 +296,7 @@ void checkDamagedCopies(const std::string& good, bool strictCuts, bool strictFli
     }
 
     std::mt19937 random(12345);
-    for (uint64_t offset = 0; offset < bytes.size(); offset += offset < 256 ? 1 : 5) {
+    for (uint64_t offset : flipOffsets(layout, bytes.size(), random)) {
         Bytes flipped = bytes;
         flipped[offset] ^= static_cast<uint8_t>(1u << (random() % 8));
         testutil::writeBytes(copy, flipped);

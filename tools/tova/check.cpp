@@ -303,10 +303,14 @@ int damaged(const std::string& path, const Problem& problem) {
 }  // namespace
 
 int runCheck(const CheckOptions& options) {
+    std::error_code ec;
+    if (std::filesystem::exists(options.file, ec) && !std::filesystem::is_directory(options.file, ec) &&
+        !std::filesystem::is_regular_file(options.file, ec)) {
+        throw Failure(options.file + " is not a regular file");
+    }
     int32_t status = 0;
     const RecordFileInfo info = probeRecordFile(options.file, &status);
     if (status != F_NO_ERROR) {
-        std::error_code ec;
         // A file that cannot be opened at all is no damaged file: say why.
         if (status == F_ERR_OPEN || std::filesystem::is_directory(options.file, ec)) probeRecordFile(options.file);
         return damaged(options.file, diagnoseOpenFailure(options.file, info.size, status));

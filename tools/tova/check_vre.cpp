@@ -7,6 +7,7 @@
 // through the VRE API to see that the reader gets every item.
 #include <array>
 #include <cstring>
+#include <initializer_list>
 #include <memory>
 #include <string>
 #include <type_traits>

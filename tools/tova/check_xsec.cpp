@@ -5,6 +5,7 @@
 // then loads the file through the cross-section API, which must accept it and
 // yield every cross section.
 #include <array>
+#include <initializer_list>
 #include <memory>
 #include <string>
 

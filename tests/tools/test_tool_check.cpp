@@ -78,8 +78,7 @@ TEST(ToolCheck, SoundFilesPassWithTheirCounts) {
     for (const std::string& path : {vre, grd, raw, xfs}) {
         const tooltest::Run run = runTova({"check", path});
         EXPECT_EQ(run.exitCode, 0) << path << "\n" << run.out << run.err;
-        EXPECT_TRUE(endsWith(run.out, okLine(tooltest::walkLayout(path), testutil::readBytes(path).size())))
-            << run.out;
+        EXPECT_TRUE(endsWith(run.out, okLine(tooltest::walkLayout(path), testutil::readBytes(path).size()))) << run.out;
     }
     EXPECT_NE(runTova({"check", raw}).out.find("unknown application"), std::string::npos);
     EXPECT_NE(runTova({"check", grd}).out.find("not available yet"), std::string::npos);
@@ -337,7 +336,8 @@ TEST(ToolCheck, RandomBodiesNeverCrashTheTool) {
         Bytes body(random() % 300);
         for (uint8_t& b : body) b = static_cast<uint8_t>(random());
         // Bias towards record marks so that the walk gets somewhere.
-        for (size_t k = 0; k < body.size(); k += 1 + random() % 9) body[k] = static_cast<uint8_t>(0xF8 + random() % 8 + 1);
+        for (size_t k = 0; k < body.size(); k += 1 + random() % 9)
+            body[k] = static_cast<uint8_t>(0xF8 + random() % 8 + 1);
         const std::string path = dir.file("r" + std::to_string(i));
         writeRawFile(path, body);
         const tooltest::Run run = runTova({"check", path});

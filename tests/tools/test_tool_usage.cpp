@@ -10,20 +10,20 @@ using tooltest::runTova;
 
 TEST(ToolUsage, BadCommandLinesExitWithTwoAndSayWhy) {
     const std::vector<std::vector<std::string>> bad = {
-        {},                                        // no subcommand
-        {"frobnicate"},                            // unknown subcommand
-        {"info"},                                  // FILE missing
-        {"info", "a", "b"},                        // one FILE too many
-        {"info", "--colour", "x"},                 // unknown option
-        {"check"},                                 //
-        {"units", "--json", "a", "b"},             //
-        {"dump", "f", "--format", "xml"},          // not text or csv
-        {"dump", "f", "--step", "1", "--steps", "1:2"},
-        {"dump", "f", "--steps", "5:2"},           // ends before it begins
-        {"dump", "f", "--steps", "x:2"},           //
-        {"dump", "f", "--item", "0"},              // items count from 1
-        {"dump", "f", "--static", "1", "--step", "0"},
-        {"stats", "f", "--item", "-3"},
+        {},                                              // no subcommand
+        {"frobnicate"},                                  // unknown subcommand
+        {"info"},                                        // FILE missing
+        {"info", "a", "b"},                              // one FILE too many
+        {"info", "--colour", "x"},                       // unknown option
+        {"check"},                                       // FILE missing
+        {"units", "--json", "a", "b"},                   // one QUERY too many
+        {"dump", "f", "--format", "xml"},                // not text or csv
+        {"dump", "f", "--step", "1", "--steps", "1:2"},  // one or the other
+        {"dump", "f", "--steps", "5:2"},                 // ends before it begins
+        {"dump", "f", "--steps", "x:2"},                 // not a number
+        {"dump", "f", "--item", "0"},                    // items count from 1
+        {"dump", "f", "--static", "1", "--step", "0"},   // static items have no steps
+        {"stats", "f", "--item", "-3"},                  // items count from 1
     };
     for (const auto& args : bad) {
         const tooltest::Run run = runTova(args);

@@ -1,12 +1,12 @@
 // Helpers of the tool tests (see tool_test.h).
 #include "tool_test.h"
 
-#include <cstdlib>
-#include <cstring>
 #include <fcntl.h>
 #include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
+#include <cstdlib>
+#include <cstring>
 
 #include <fstream>
 #include <memory>

@@ -12,10 +12,10 @@
 namespace tooltest {
 
 struct Run {
-    int exitCode = -1;    // the status passed to exit(), -1 when killed by a signal
-    int signal = 0;       // the signal that ended the program, 0 if none
-    std::string out;      // standard output
-    std::string err;      // standard error
+    int exitCode = -1;  // the status passed to exit(), -1 when killed by a signal
+    int signal = 0;     // the signal that ended the program, 0 if none
+    std::string out;    // standard output
+    std::string err;    // standard error
 
     // Ended by exit() with 0, 1 or 2 and without a sanitizer report.
     bool clean() const;

@@ -16,6 +16,7 @@
 
 #include "check.h"
 #include "grd_commands.h"
+#include "handles.h"
 #include "progress.h"
 #include "text.h"
 #include "tova/rcf.h"
@@ -40,15 +41,6 @@ constexpr uint64_t kBannerLength = sizeof(kBanner) - 1;
 constexpr unsigned char kEndOfText = 0x1A;
 constexpr uint64_t kStampBytes = 48;  // two stamp groups and two reserved words
 constexpr uint64_t kMaxHeaderRead = 1u << 20;
-
-uint32_t acceptAnyApplication(uint32_t* version) {
-    *version = 0;
-    return RCF_ACCEPT_ANY_APP;
-}
-
-struct Closer {
-    void operator()(FileHandle h) const { rcfFileClose(&h); }
-};
 
 std::string hexByte(unsigned char b) {
     char text[8];
@@ -120,8 +112,8 @@ int32_t readInt(const unsigned char* p, size_t size, bool swapped) {
 // A stamp is six zeros (the clock could not be read) or a plain date and time.
 bool validStamp(const int32_t s[6]) {
     if (std::all_of(s, s + 6, [](int32_t v) { return v == 0; })) return true;
-    return s[0] >= 1 && s[0] <= 9999 && s[1] >= 1 && s[1] <= 12 && s[2] >= 1 && s[2] <= 31 && s[3] >= 0 &&
-           s[3] <= 23 && s[4] >= 0 && s[4] <= 59 && s[5] >= 0 && s[5] <= 60;
+    return s[0] >= 1 && s[0] <= 9999 && s[1] >= 1 && s[1] <= 12 && s[2] >= 1 && s[2] <= 31 && s[3] >= 0 && s[3] <= 23 &&
+           s[4] >= 0 && s[4] <= 59 && s[5] >= 0 && s[5] <= 60;
 }
 
 // The text each known kind's writer puts after the banner; null: any.
@@ -145,9 +137,9 @@ std::optional<Problem> checkHeaderBytes(const RecordFileInfo& info) {
     const std::vector<unsigned char> head = readBytes(info.path, 0, std::min<uint64_t>(textEnd, kMaxHeaderRead));
     for (uint64_t i = 0; i < kBannerLength && kBannerOffset + i < head.size(); ++i) {
         if (head[kBannerOffset + i] != static_cast<unsigned char>(kBanner[i])) {
-            return Problem{static_cast<int64_t>(kBannerOffset + i),
-                           "the banner text of the file header is damaged (byte " + hexByte(head[kBannerOffset + i]) +
-                               ")"};
+            return Problem{
+                static_cast<int64_t>(kBannerOffset + i),
+                "the banner text of the file header is damaged (byte " + hexByte(head[kBannerOffset + i]) + ")"};
         }
     }
     // An application text, when there is one, follows two blanks. The
@@ -155,8 +147,9 @@ std::optional<Problem> checkHeaderBytes(const RecordFileInfo& info) {
     const uint64_t textStart = kBannerOffset + kBannerLength;
     if (const char* text = applicationText(info.kind)) {
         const std::string expected = *text != '\0' ? std::string("  ") + text : std::string();
-        const std::string found(head.begin() + static_cast<std::ptrdiff_t>(textStart),
-                                head.begin() + static_cast<std::ptrdiff_t>(std::min<uint64_t>(head.size(), textStart + 64)));
+        const std::string found(
+            head.begin() + static_cast<std::ptrdiff_t>(textStart),
+            head.begin() + static_cast<std::ptrdiff_t>(std::min<uint64_t>(head.size(), textStart + 64)));
         if (textEnd - textStart != expected.size() || found != expected) {
             const auto diff = std::mismatch(found.begin(), found.end(), expected.begin(), expected.end());
             const std::string due = expected.empty() ? "none" : "\"" + expected.substr(2) + "\"";
@@ -173,8 +166,8 @@ std::optional<Problem> checkHeaderBytes(const RecordFileInfo& info) {
         }
         for (uint64_t i = textStart + 2; i < head.size(); ++i) {
             if (head[i] < 0x20 || head[i] >= 0x7F) {
-                return Problem{static_cast<int64_t>(i), "the application text of the file header holds the byte " +
-                                                            hexByte(head[i])};
+                return Problem{static_cast<int64_t>(i),
+                               "the application text of the file header holds the byte " + hexByte(head[i])};
             }
         }
     }
@@ -317,10 +310,8 @@ int runCheck(const CheckOptions& options) {
     }
     if (auto problem = checkHeaderBytes(info)) return damaged(options.file, *problem);
 
-    FileHandle opened = nullptr;
-    status = rcfFileOpenRead(options.file.c_str(), &opened, acceptAnyApplication, nullptr);
+    RcfFilePtr file = openRecordFile(options.file, &status);
     if (status != F_NO_ERROR) throw Failure("cannot open " + options.file + " again: status " + statusText(status));
-    std::unique_ptr<RcfFile, Closer> file(opened);
 
     std::unique_ptr<KindCheck> kind = kindCheck(info);
     Counts counts;

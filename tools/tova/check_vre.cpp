@@ -6,14 +6,13 @@
 // count, index field and unit with what is due there, and then loads the file
 // through the VRE API to see that the reader gets every item.
 #include <array>
-#include <cstring>
 #include <initializer_list>
 #include <memory>
 #include <string>
-#include <type_traits>
 #include <vector>
 
 #include "check.h"
+#include "handles.h"
 #include "qty/qty.h"
 #include "tova/rcf.h"
 #include "tova/vre.h"
@@ -22,24 +21,8 @@ namespace tova_cli {
 
 namespace {
 
-struct Closer {
-    void operator()(FileHandle h) const { rcfFileClose(&h); }
-};
-
-struct VreFree {
-    void operator()(VreHandle h) const { vreHandleFree(h); }
-};
-using VrePtr = std::unique_ptr<std::remove_pointer_t<VreHandle>, VreFree>;
-
-uint32_t vreIdent(uint32_t* version) {
-    *version = 101;
-    uint32_t tag = 0;
-    std::memcpy(&tag, "VRE_", 4);
-    return tag;
-}
-
-constexpr const char* kParamName[VRE_SIZE_PARAMS] = {"N0", "body count", "total panel count", "N3",
-                                                     "N4", "parameter 5", "parameter 6", "N7"};
+constexpr const char* kParamName[VRE_SIZE_PARAMS] = {"N0", "body count",  "total panel count", "N3",
+                                                     "N4", "parameter 5", "parameter 6",       "N7"};
 
 // What the file's records say so far, and the element counts that follow.
 struct Sizes {
@@ -62,16 +45,21 @@ struct Sizes {
         };
         switch (k) {
         case 0: return product({12, n0});
-        case 1: case 3: return product({3, pt});
+        case 1:
+        case 3: return product({3, pt});
         case 2: return product({pt});
         case 4: return product({pt, n3});
-        case 5: case 6: return product({3, b});
+        case 5:
+        case 6: return product({3, b});
         case 7: return product({b});
         case 8: return product({n3, n3});
-        case 9: case 10: return product({n4});
+        case 9:
+        case 10: return product({n4});
         case 11: return product({9, b});
-        case 12: case 13: return product({pt, n4, n3});
-        case 14: case 15: return product({n4, n3, n3});
+        case 12:
+        case 13: return product({pt, n4, n3});
+        case 14:
+        case 15: return product({n4, n3, n3});
         case 21: return product({n7});
         case 22: return product({n7, n4, n3});
         default: return product({b});  // 16 to 20
@@ -157,7 +145,8 @@ private:
     }
 
     void param(int index) {
-        const std::string what = std::string("size parameter ") + std::to_string(index) + " (" + kParamName[index] + ")";
+        const std::string what =
+            std::string("size parameter ") + std::to_string(index) + " (" + kParamName[index] + ")";
         const int64_t at = rcfTell64(f_);
         const int32_t value = readInt(what);
         if (problem_) return;
@@ -257,13 +246,12 @@ public:
     std::optional<Problem> finish() override {
         const uint32_t version = info_.versionCreateApp;
         if (version != 100 && version != 101) {
-            return Problem{info_.rcfBase + 16, "VRE format version " + std::to_string(version) +
-                                                   " is unknown (100 and 101 are read)"};
+            return Problem{info_.rcfBase + 16,
+                           "VRE format version " + std::to_string(version) + " is unknown (100 and 101 are read)"};
         }
-        FileHandle opened = nullptr;
-        const int32_t status = rcfFileOpenRead(info_.path.c_str(), &opened, vreIdent, nullptr);
-        if (status != F_NO_ERROR) return Problem{0, "the VRE reader cannot open the file: status " + statusText(status)};
-        std::unique_ptr<RcfFile, Closer> file(opened);
+        int32_t status = 0;
+        RcfFilePtr file = openRecordFile(info_.path, &status);
+        if (status != F_NO_ERROR) throw Failure("cannot open " + info_.path + " again: status " + statusText(status));
         const VrePtr defaults(vreHandleCreate());
         if (!defaults) throw Failure("out of memory");
         VreLayout layout(file.get(), static_cast<int64_t>(info_.size), version, defaults.get());
@@ -286,8 +274,7 @@ private:
             const int32_t got = vreGetVectorSize(h.get(), k);
             if (due > 0 && got != due) {
                 return Problem{layout.itemOffset(k), "the VRE reader got " + std::to_string(got) + " of the " +
-                                                         std::to_string(due) + " values of item " +
-                                                         std::to_string(k)};
+                                                         std::to_string(due) + " values of item " + std::to_string(k)};
             }
         }
         return std::nullopt;

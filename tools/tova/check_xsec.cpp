@@ -92,8 +92,8 @@ private:
         block_ = m;
         records_ = 0;
         if (m.count < kKeyBlock || m.count > kCoordinateBlock) {
-            return Problem{m.offset, "block " + std::to_string(m.count) +
-                                         " is no block of cross-section files (257 to 262)"};
+            return Problem{m.offset,
+                           "block " + std::to_string(m.count) + " is no block of cross-section files (257 to 262)"};
         }
         if (m.count == kKeyBlock && keyPending_) {
             return Problem{key_.offset, "a key block without a header block"};
@@ -114,8 +114,8 @@ private:
 
     std::optional<Problem> expectType(size_t i, int32_t type) const {
         if (record_[i].type == type) return std::nullopt;
-        return at(i, std::string("record ") + std::to_string(i + 1) + " should be " + rcfSimpName(type) +
-                         ", it is " + withArticle(recordText(record_[i].type, record_[i].count)));
+        return at(i, std::string("record ") + std::to_string(i + 1) + " should be " + rcfSimpName(type) + ", it is " +
+                         withArticle(recordText(record_[i].type, record_[i].count)));
     }
 
     std::optional<Problem> wrongCount(const std::string& due) const {
@@ -146,7 +146,8 @@ private:
             for (size_t i = 0; i < records_; ++i) {
                 if (auto p = expectType(i, i == 1 ? RCF_DOUBLE : RCF_BYTE)) return p;
             }
-            if (record_[1].count != 1) return at(1, "the key value is one double, not " + std::to_string(record_[1].count));
+            if (record_[1].count != 1)
+                return at(1, "the key value is one double, not " + std::to_string(record_[1].count));
             keyPending_ = true;
             key_ = block_;
             fourRecordKey_ = records_ == 4;
@@ -188,7 +189,7 @@ private:
     }
 
     RecordFileInfo info_;
-    Mark block_;                          // the block being walked
+    Mark block_;                              // the block being walked
     std::array<Mark, kMaxRecords> record_{};  // its records so far
     size_t records_ = 0;
     Mark key_;                 // the last key block

@@ -7,8 +7,8 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
-#include <memory>
 
+#include "handles.h"
 #include "tova/rcf.h"
 #include "tova_cli.h"
 
@@ -21,11 +21,13 @@ uint32_t acceptAnyApplication(uint32_t* version) {
     return RCF_ACCEPT_ANY_APP;
 }
 
-struct Closer {
-    void operator()(FileHandle h) const { rcfFileClose(&h); }
-};
-
 }  // namespace
+
+RcfFilePtr openRecordFile(const std::string& path, int32_t* status) {
+    FileHandle opened = nullptr;
+    *status = rcfFileOpenRead(path.c_str(), &opened, acceptAnyApplication, nullptr);
+    return RcfFilePtr(opened);
+}
 
 const char* kindId(FileKind kind) {
     switch (kind) {
@@ -78,11 +80,8 @@ RecordFileInfo probeRecordFile(const std::string& path, int32_t* status) {
     info.size = std::filesystem::file_size(path, ec);
     if (ec) info.size = 0;
 
-    FileHandle opened = nullptr;
-    uint32_t appTag = 0;
-    *status = rcfFileOpenRead(path.c_str(), &opened, acceptAnyApplication, &appTag);
+    const RcfFilePtr file = openRecordFile(path, status);
     if (*status != F_NO_ERROR) return info;
-    const std::unique_ptr<RcfFile, Closer> file(opened);
 
     // The tag and application tag bytes as stored: the order they come in
     // shows the writer's byte order, and the application tag is four
@@ -178,8 +177,8 @@ Value describeRecordFile(const RecordFileInfo& file) {
     doc.add("description", kindDescription(file.kind));
     doc.add("size", file.size);
     const bool little = hostIsLittleEndian() != file.swapped;
-    doc.add("byteOrder", std::string(little ? "little-endian" : "big-endian") +
-                             (file.swapped ? " (swapped on this machine)" : ""));
+    doc.add("byteOrder",
+            std::string(little ? "little-endian" : "big-endian") + (file.swapped ? " (swapped on this machine)" : ""));
     doc.add("applicationTag", tagText(file.appTag));
     doc.add("created", file.created);
     doc.add("edited", file.edited);

@@ -1,11 +1,10 @@
 // The VRE part of `tova info`: size parameters, symmetry, bodies with their
 // names and panel counts, the two scalar items and which of the 23 vector
 // items the file holds, each with its quantity and storage unit.
-#include <memory>
 #include <string_view>
-#include <type_traits>
 #include <vector>
 
+#include "handles.h"
 #include "qty/qty.h"
 #include "tova/vre.h"
 #include "tova_cli.h"
@@ -14,13 +13,8 @@ namespace tova_cli {
 
 namespace {
 
-struct VreFree {
-    void operator()(VreHandle h) const { vreHandleFree(h); }
-};
-using VrePtr = std::unique_ptr<std::remove_pointer_t<VreHandle>, VreFree>;
-
-constexpr const char* kParamMeaning[VRE_SIZE_PARAMS] = {
-    "N0", "body count", "total panel count", "N3", "N4", "", "1: items 21 and 22 present", "N7"};
+constexpr const char* kParamMeaning[VRE_SIZE_PARAMS] = {"N0", "body count", "total panel count",          "N3",
+                                                        "N4", "",           "1: items 21 and 22 present", "N7"};
 
 std::string quantityName(int32_t key) {
     const char* text = nullptr;

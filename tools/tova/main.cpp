@@ -59,8 +59,9 @@ int run(int argc, char** argv) {
     CLI::App app{"Looks into the data files of the tova library: gridded data, cross sections, VRE files.", "tova"};
     app.set_version_flag("--version", versionText());
     app.require_subcommand(1);
-    app.footer("Exit status: 0 success, 1 damaged file or failed command, 2 bad usage.\n"
-               "Run `tova SUBCOMMAND --help` for the options of a subcommand.");
+    app.footer(
+        "Exit status: 0 success, 1 damaged file or failed command, 2 bad usage.\n"
+        "Run `tova SUBCOMMAND --help` for the options of a subcommand.");
 
     InfoOptions info;
     CLI::App* infoCmd = app.add_subcommand("info", "Summary of a file: kind, header, versions and contents");
@@ -81,10 +82,11 @@ int run(int argc, char** argv) {
     CLI::Option* stepsOpt = dumpCmd->add_option("--steps", dumpSteps, "time steps A to B (0-based, inclusive)")
                                 ->type_name("A:B")
                                 ->excludes(stepOpt);
-    CLI::Option* staticOpt = dumpCmd->add_option("--static", dumpStatic, "static item N (1-based) instead of time steps")
-                                 ->check(CLI::PositiveNumber)
-                                 ->excludes(stepOpt)
-                                 ->excludes(stepsOpt);
+    CLI::Option* staticOpt =
+        dumpCmd->add_option("--static", dumpStatic, "static item N (1-based) instead of time steps")
+            ->check(CLI::PositiveNumber)
+            ->excludes(stepOpt)
+            ->excludes(stepsOpt);
     dumpCmd->add_option("--format", dumpFormat, "text or csv")->check(CLI::IsMember({"text", "csv"}));
 
     StatsOptions stats;
@@ -110,11 +112,12 @@ int run(int argc, char** argv) {
     demoCmd->add_option("OUT", demo.out, "the file to write")->capture_default_str();
 
     // CLI11 would call an unknown subcommand a stray argument; name it.
-    if (argc > 1 && argv[1][0] != '-' && app.get_subcommands([&](CLI::App* sub) {
-                                             return sub->get_name() == argv[1];
-                                         }).empty()) {
-        std::fprintf(stderr, "tova: unknown subcommand \"%s\" (info, check, units, dump, stats, demo)\n"
-                             "Run with --help for more information.\n", argv[1]);
+    if (argc > 1 && argv[1][0] != '-' &&
+        app.get_subcommands([&](CLI::App* sub) { return sub->get_name() == argv[1]; }).empty()) {
+        std::fprintf(stderr,
+                     "tova: unknown subcommand \"%s\" (info, check, units, dump, stats, demo)\n"
+                     "Run with --help for more information.\n",
+                     argv[1]);
         return kExitUsage;
     }
 

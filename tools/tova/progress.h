@@ -29,7 +29,8 @@ public:
     void update(uint64_t done) {
         if (!shown_ || (++calls_ & 1023u) != 0) return;
         const auto now = std::chrono::steady_clock::now();
-        if (drawn_ && now - last_ < std::chrono::milliseconds(250)) return;
+        // Nothing for work that ends within half a second; then four a second.
+        if (now - (drawn_ ? last_ : start_) < std::chrono::milliseconds(drawn_ ? 250 : 500)) return;
         last_ = now;
         drawn_ = true;
         const double percent = total_ != 0 ? 100.0 * static_cast<double>(done) / static_cast<double>(total_) : 100.0;
@@ -51,6 +52,7 @@ private:
     bool shown_;
     bool drawn_ = false;
     uint32_t calls_ = 0;
+    std::chrono::steady_clock::time_point start_ = std::chrono::steady_clock::now();
     std::chrono::steady_clock::time_point last_{};
 };
 

@@ -561,6 +561,8 @@ int32_t rcfFileOpenEdit(const char* path, FileHandle* out, rcfAppIdent appIdent,
     return tova::guarded([&] { return openEdit(path, out, appIdent, appTagOut); });
 }
 
+uint32_t rcfClockMs() { return clockMs(); }
+
 void rcfSeekAppBase(FileHandle h) {
     if (h != nullptr) seekTo(h, h->appBase, 0);
 }

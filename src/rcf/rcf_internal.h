@@ -77,6 +77,8 @@ int32_t rcfFileOpenEdit(const char* path, FileHandle* out, rcfAppIdent appIdent,
 int32_t rcfFileOpen(const char* path, FileHandle* out, const char* mode, rcfAppIdent appIdent,
                     uint32_t* appTagOut);
 void rcfSeekAppBase(FileHandle h);
+// Monotonic milliseconds, the clock of openClock (flush throttles compare against it).
+uint32_t rcfClockMs();
 // This layer's own status reporter (module "rcf"); returns code.
 int32_t rcfReportError(int32_t code, const char* module, int32_t line);
 

@@ -10,6 +10,7 @@
 #include "tova/trace.h"
 #include "tova/vre.h"
 #include "tova/workspace.h"
+#include "tova/xfs.h"
 
 int main(void) {
     if (rcfGetVersionCurrent() != 104) return 1;
@@ -32,6 +33,18 @@ int main(void) {
         if (vreGetSymmetry(vre, &first, &second) != 0 || first != 1 || second != 0) return 11;
         if (vreGetVectorParam(vre, 8) != -1) return 12;
         vreHandleFree(vre);
+    }
+    /* The cross-section record has the same packed layout in C. */
+    if (sizeof(XsecData) != (sizeof(void*) == 4 ? 338u : 418u)) return 13;
+    if (xfsXsecTableVersion(NULL) != 100) return 14;
+    {
+        XsecHandle x = xfsXsecCreate("river", 1.5, "reach");
+        if (x == NULL || x->headerWords[23] != 2 || x->headerValues[15] != 0.001) return 15;
+        if (xfsXsecSetNoRaw(x, 3) != 1 || x->noRaw != 3) return 16;
+        x->raw[2][2] = 4.0;
+        x->rawMark[1][2] = 7;
+        xfsXsecFree(&x);
+        if (x != NULL) return 17;
     }
     puts("C API ok");
     return 0;

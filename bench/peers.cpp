@@ -715,9 +715,9 @@ std::string fmt(const char* format, double v) {
 
 std::string fmtTime(double s) {
     if (std::isnan(s)) return "-";
-    if (s >= 1.0) return fmt("%.2f s", s);
-    if (s >= 1e-3) return fmt("%.3g ms", s * 1e3);
-    if (s >= 1e-6) return fmt("%.3g us", s * 1e6);
+    if (s >= 0.9995) return fmt("%.2f s", s);
+    if (s >= 0.9995e-3) return fmt("%.3g ms", s * 1e3);
+    if (s >= 0.9995e-6) return fmt("%.3g us", s * 1e6);
     return fmt("%.3g ns", s * 1e9);
 }
 
@@ -906,10 +906,18 @@ private:
         }
     }
 
-    // Writes and reads a grid shape with every contender, repeats times,
-    // taking the contenders in turn in every round so that a change in the
-    // machine's load falls on all of them. An untimed round goes first, so
-    // that no contender pays for the page cache's first growth.
+    // The contender that comes i-th in round `round`: every round starts
+    // with the next one, so that no contender always follows the same
+    // other (the cost of writing into the page cache depends on what the
+    // previous file left behind) and a change of the machine's load falls on
+    // all of them.
+    size_t turn(int round, size_t i) const {
+        return (static_cast<size_t>(std::max(round, 0)) + i) % kinds_.size();
+    }
+
+    // Writes and reads a grid shape with every contender, repeats times, in
+    // rounds over the contenders. An untimed round goes first, so that no
+    // contender pays for the page cache's first growth.
     std::vector<Row> gridRows(const std::string& tag, const Shape& s) {
         GridValues values(s);
         std::vector<unsigned char> buffer(values.bytes());
@@ -917,9 +925,9 @@ private:
         std::vector<std::vector<double>> w(n), r(n);
         std::vector<std::string> notes(n);
         for (int rep = -1; rep < opt_.repeats; ++rep)
-            for (size_t j = 0; j < n; ++j) {
+            for (size_t i = 0; i < n; ++i) {
+                const size_t j = turn(rep, i);
                 const ContenderKind& k = *kinds_[j];
-                if (rep < 0 && j > 0) break;
                 progress(tag + (rep < 0 ? ", warm-up" : ", round " + std::to_string(rep + 1)), k);
                 const std::string p = path(k, "grid");
                 auto c = k.make(nullptr);
@@ -997,7 +1005,8 @@ private:
             return seriesShape(opt_.seriesItems, k.key == "nc4" ? opt_.seriesStepsNc4 : opt_.seriesSteps);
         };
         for (int rep = 0; rep < opt_.repeats; ++rep)
-            for (size_t j = 0; j < n; ++j) {
+            for (size_t i = 0; i < n; ++i) {
+                const size_t j = turn(rep, i);
                 const ContenderKind& k = *kinds_[j];
                 progress("time series, round " + std::to_string(rep + 1), k);
                 const Shape s = shapeOf(k);
@@ -1182,24 +1191,27 @@ private:
         }
         if (tova == nullptr) return (void)std::printf("(tova not among the contenders)\n");
         GridValues values(s);
-        std::vector<double> w1, w2, wr;
-        for (int rep = 0; rep < opt_.repeats; ++rep) {
-            std::fprintf(stderr, "  statistics: repeat %d\n", rep + 1);
-            for (int type : {1, 2}) {
-                s.statsType = type;
-                const std::string p = path(*tova, "stats");
-                auto c = tova->make(nullptr);
-                (type == 1 ? w1 : w2).push_back(writeGrid(*c, p, s, values));
+        // Three variants in rounds, each round starting with the next one.
+        struct Variant {
+            const ContenderKind* kind;
+            int statsType;
+            std::vector<double> times;
+        };
+        std::vector<Variant> variants = {{tova, 1, {}}, {tova, 2, {}}};
+        if (raw) variants.push_back({raw, 1, {}});
+        for (int rep = 0; rep < opt_.repeats; ++rep)
+            for (size_t i = 0; i < variants.size(); ++i) {
+                Variant& v = variants[(static_cast<size_t>(rep) + i) % variants.size()];
+                std::fprintf(stderr, "  statistics, round %d: %s, type %d\n", rep + 1, v.kind->title.c_str(),
+                             v.statsType);
+                s.statsType = v.statsType;
+                const std::string p = path(*v.kind, "stats");
+                auto c = v.kind->make(nullptr);
+                v.times.push_back(writeGrid(*c, p, s, values));
                 remove(p);
             }
-            if (raw) {
-                const std::string p = path(*raw, "stats");
-                auto c = raw->make(nullptr);
-                wr.push_back(writeGrid(*c, p, s, values));
-                remove(p);
-            }
-        }
-        const double t1 = median(w1), t2 = median(w2), tr = median(wr);
+        const double t1 = median(variants[0].times), t2 = median(variants[1].times);
+        const double tr = raw ? median(variants[2].times) : NAN;
         std::printf("| write | time | rate | speed vs raw | cost of type 2 |\n|---|---|---|---|---|\n");
         if (raw) std::printf("| raw stdio | %s | %s | 1.00x | |\n", fmtTime(tr).c_str(), fmtRate(s.totalBytes() / tr).c_str());
         std::printf("| tova, statistics type 1 | %s | %s | %s | |\n", fmtTime(t1).c_str(),

@@ -53,6 +53,12 @@ struct Clock {
 };
 double since(Clock::time_point t0) { return Clock::now() - t0; }
 
+double threadCpuNow() {
+    timespec t{};
+    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &t);
+    return static_cast<double>(t.tv_sec) + static_cast<double>(t.tv_nsec) * 1e-9;
+}
+
 double wallNow() {
     timespec t{};
     clock_gettime(CLOCK_MONOTONIC, &t);
@@ -1253,8 +1259,11 @@ private:
         heading("7. Threads",
                 "1, 2 and 4 threads each read their own copy of workload 1 (" + std::to_string(s.steps) +
                     " time steps, " + fmt("%.2f", s.totalBytes() / 1e9) +
-                    " GB per copy). Aggregate read rate and speed-up over one thread. netCDF-C and HDF5 are not "
-                    "thread-safe: every netCDF call holds one global lock. The machine has " +
+                    " GB per copy). Aggregate read rate (wall-clock time) and speed-up over one thread; *cores "
+                    "busy* is the CPU time of the reading threads over the wall-clock time: what the threads got "
+                    "of the machine (at most the thread count or the free cores; a lock holds it near 1). "
+                    "netCDF-C and HDF5 are not thread-safe: every netCDF call holds one global lock. The machine "
+                    "has " +
                     std::to_string(std::thread::hardware_concurrency()) + " hardware threads. Median of " +
                     std::to_string(opt_.repeats) + ".");
         GridValues values(s);
@@ -1263,8 +1272,10 @@ private:
         for (int n : opt_.threads) std::printf(" %d thread%s |", n, n == 1 ? "" : "s");
         for (int n : opt_.threads)
             if (n != 1) std::printf(" speed-up %d |", n);
-        std::printf("\n|---|");
-        for (size_t i = 0; i < opt_.threads.size() * 2 - 1; ++i) std::printf("---|");
+        std::printf(" cores busy (");
+        for (size_t i = 0; i < opt_.threads.size(); ++i) std::printf("%s%d", i ? " / " : "", opt_.threads[i]);
+        std::printf(") |\n|---|");
+        for (size_t i = 0; i < opt_.threads.size() * 2; ++i) std::printf("---|");
         std::printf("\n");
         for (auto* k : kinds_) {
             progress("threads", *k);
@@ -1275,15 +1286,16 @@ private:
                 auto c = k->make(nullptr);
                 writeGrid(*c, copies.back(), s, values);
             }
-            std::vector<double> rate;
+            std::vector<double> rate, busy;
             for (int n : opt_.threads) {
-                std::vector<double> runs;
+                std::vector<double> runs, used;
                 for (int rep = 0; rep < opt_.repeats; ++rep) {
                     // The clock starts when every thread is ready and
                     // before any is let go.
                     std::latch armed(n), go(1);
                     std::vector<std::thread> pool;
                     std::vector<std::string> errors(static_cast<size_t>(n));
+                    std::vector<double> cpu(static_cast<size_t>(n));
                     for (int i = 0; i < n; ++i)
                         pool.emplace_back([&, i] {
                             try {
@@ -1292,7 +1304,9 @@ private:
                                 std::vector<unsigned char> buffer(values.bytes());
                                 armed.count_down();
                                 go.wait();
+                                const double c0 = threadCpuNow();
                                 readGrid(*c, copies[static_cast<size_t>(i)], s, values, buffer.data());
+                                cpu[static_cast<size_t>(i)] = threadCpuNow() - c0;
                             } catch (const std::exception& e) {
                                 errors[static_cast<size_t>(i)] = e.what();
                             }
@@ -1302,17 +1316,21 @@ private:
                     go.count_down();
                     for (auto& t : pool) t.join();
                     runs.push_back(wallNow() - t0);
+                    used.push_back(std::accumulate(cpu.begin(), cpu.end(), 0.0) / runs.back());
                     for (const auto& e : errors)
                         if (!e.empty()) fail(e);
                 }
                 rate.push_back(n * s.totalBytes() / median(runs));
+                busy.push_back(median(used));
             }
             for (const auto& p : copies) remove(p);
             std::printf("| %s |", k->title.c_str());
             for (double r : rate) std::printf(" %s |", fmtRate(r).c_str());
             for (size_t i = 0; i < opt_.threads.size(); ++i)
                 if (opt_.threads[i] != 1) std::printf(" %s |", fmtRatio(rate[i] / rate[0]).c_str());
-            std::printf("\n");
+            std::printf(" ");
+            for (size_t i = 0; i < busy.size(); ++i) std::printf("%s%.2f", i ? " / " : "", busy[i]);
+            std::printf(" |\n");
             if (k->key == "tova")
                 for (size_t i = 0; i < opt_.threads.size(); ++i)
                     if (opt_.threads[i] == 2) {

@@ -148,7 +148,8 @@ def test_refusals_raise_with_the_library_status(tmp_path):
         Item("flag", "WaterLevel", "m", np.int64)
     assert err.value.status == F_ERR_VALUE
     with pytest.raises(TovaError):
-        tova.create(tmp_path / "d.grd", [Item("a", "WaterLevel", "m"), Item("a", "WaterLevel", "m")])
+        tova.create(tmp_path / "d.grd", [Item("a", "WaterLevel", "m"), Item("a", "WaterLevel", "m")],
+                    TimeAxis.equidistant(1.0))
 
     path = tmp_path / "ok.grd"
     tova.create(path, [Item("level", "WaterLevel", "m")], TimeAxis.equidistant(60.0)).close()

@@ -336,7 +336,6 @@ TOVA_PROTOTYPES.update({
     "grdFindBlockStatic": (i32, [_H, _H]),
     "grdFindTimeStep": (i32, [_H, _H, i32]),
     "grdFindItemDynamic": (i32, [_H, _H, i32, i32]),
-    "rcfGetError": (i32, [_H]),
     "rcfFileClose": (i32, [p_handle]),
 })
 

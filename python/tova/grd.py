@@ -25,7 +25,7 @@ import operator
 import os
 import weakref
 from ctypes import POINTER, byref, c_char_p, c_double, c_float, c_int32, c_void_p
-from dataclasses import dataclass, field
+from dataclasses import dataclass
 from functools import cached_property
 from typing import Any, NamedTuple
 
@@ -545,10 +545,45 @@ def _index(value, length: int, what: str) -> int:
     return i % length
 
 
+def _delete_values_of(lib, h) -> DeleteValues:
+    return DeleteValues(lib.grdGetDeleteValFloat(h), lib.grdGetDeleteValDouble(h), lib.grdGetDeleteValByte(h),
+                        lib.grdGetDeleteValInt(h), lib.grdGetDeleteValUnsignedInt(h))
+
+
+class _OpenFile:
+    """The header and file handles of an open file, released exactly once:
+    by ``close``, on leaving a ``with`` block, or when the object goes."""
+
+    path: str
+
+    def _own(self, lib, header: c_void_p, file: c_void_p) -> None:
+        self._lib, self._header, self._file = lib, header, file
+        self._finalizer = weakref.finalize(self, _release, lib, header, file)
+
+    def _handles(self):
+        if not self._finalizer.alive:
+            raise TovaError(F_ERR_ARGUMENT, self.path, "the file is closed")
+        return self._lib, self._header, self._file
+
+    @property
+    def closed(self) -> bool:
+        return not self._finalizer.alive
+
+    def close(self) -> None:
+        """Closes the file and frees its header; later calls raise."""
+        self._finalizer()
+
+    def __enter__(self):
+        return self
+
+    def __exit__(self, *exc) -> None:
+        self.close()
+
+
 # ---- Reader -------------------------------------------------------------------------
 
 
-class GridFile:
+class GridFile(_OpenFile):
     """A gridded data file open for reading (read-only). Use as a context
     manager, or call ``close``; the handles are also released when the object
     is collected.
@@ -574,8 +609,7 @@ class GridFile:
             if status:
                 _release(lib, header, file)
                 check(status, self.path)
-            self._lib, self._header, self._file = lib, header, file
-            self._finalizer = weakref.finalize(self, _release, lib, header, file)
+            self._own(lib, header, file)
             try:
                 # Times as stored, and calendar texts as stored: dates are
                 # computed here from the start and the times.
@@ -592,9 +626,7 @@ class GridFile:
         self.app_version = lib.grdGetAppVersionNo(h)
         self.data_type = lib.grdGetDataType(h)
         self.stats_type = lib.grdGetItemStatsType(h)
-        self.delete_values = DeleteValues(lib.grdGetDeleteValFloat(h), lib.grdGetDeleteValDouble(h),
-                                          lib.grdGetDeleteValByte(h), lib.grdGetDeleteValInt(h),
-                                          lib.grdGetDeleteValUnsignedInt(h))
+        self.delete_values = _delete_values_of(lib, h)
         self.projection = None
         if lib.grdGetGeoInfoType(h) == 1:
             text, lon, lat, orient = c_char_p(), c_double(), c_double(), c_double()
@@ -605,52 +637,19 @@ class GridFile:
         self.compressed = bool(lib.grdIsFileCompressed(h))
         self.items = [_item_of(lib, lib.grdItemD(h, n), n) for n in range(1, lib.grdGetNoOfItems(h) + 1)]
 
-    # Lifecycle ----------------------------------------------------------------------
-    def close(self) -> None:
-        """Closes the file and frees its header; later reads raise."""
-        self._finalizer()
-
-    @property
-    def closed(self) -> bool:
-        return not self._finalizer.alive
-
-    def __enter__(self) -> "GridFile":
-        return self
-
-    def __exit__(self, *exc) -> None:
-        self.close()
-
     def __repr__(self) -> str:
         state = "closed" if self.closed else f"{len(self.items)} items, {self.n_steps} steps"
         return f"<tova.GridFile {self.path!r} {self.file_type_name} ({state})>"
-
-    def _handles(self):
-        if self.closed:
-            raise TovaError(F_ERR_ARGUMENT, self.path, "the file is closed")
-        return self._lib, self._header, self._file
 
     # Header -------------------------------------------------------------------------
     @property
     def file_type_name(self) -> str:
         return FILE_TYPES.get(self.file_type, "*** FileType error ***")
 
-    @cached_property
+    @property
     def n_steps(self) -> int:
-        """The number of time steps: the time axis's count, or, for a file
-        without a time axis, the steps found by walking the file."""
-        if self.time_axis.kind in (1, 2, 3, 4):
-            return self.time_axis.count
-        return self._count_steps()
-
-    def _count_steps(self) -> int:
-        lib, h, f = self._handles()
-        count = 0
-        time = c_double()
-        with _lib.lock:
-            while lib.grdFindTimeStep(h, f, count) == 0 and lib.grdReadItemTimeStep(h, f, byref(time), None) == 0:
-                count += 1
-            lib.rcfGetError(f)  # the end of the data, not a failure to keep
-        return count
+        """The number of time steps, as the time axis counts them."""
+        return self.time_axis.count
 
     def item(self, key) -> Item:
         """An item by name, by position in ``items`` (0-based) or itself."""
@@ -762,7 +761,7 @@ class GridFile:
 
     def masked_dtype(self, item) -> np.dtype:
         """The element type of an item's values once delete values are NaN."""
-        item = self.item(item)
+        item = item if isinstance(item, Item) else self.item(item)
         if self.delete_values.for_dtype(item.dtype) is None or item.dtype.kind == "f":
             return item.dtype
         return np.dtype(np.float64)
@@ -771,7 +770,7 @@ class GridFile:
         """The values with the delete value of the item's element type as NaN:
         float arrays in place, other types as a new float64 array (16-bit
         types have no delete value and stay as they are)."""
-        item = self.item(item)
+        item = item if isinstance(item, Item) else self.item(item)
         marker = self.delete_values.for_dtype(item.dtype)
         if marker is None:
             return values
@@ -790,7 +789,7 @@ class GridFile:
         item = self.item(item)
         indices, single = self._steps(steps)
         out = np.empty((len(indices),) + item.shape, dtype=item.dtype)
-        rows = out.reshape(len(indices), -1)
+        rows = out.reshape(len(indices), item.size)
         with _lib.lock:
             for k, t in enumerate(indices.tolist()):
                 self._read_into(lib, h, f, item, t, rows[k])
@@ -806,7 +805,7 @@ class GridFile:
         with _lib.lock:
             for item in self.items:
                 out[item.name] = values = np.empty(item.shape, dtype=item.dtype)
-                self._read_into(lib, h, f, item, t, values.reshape(-1))
+                self._read_into(lib, h, f, item, t, values.reshape(item.size))
         if self.mask if mask is None else mask:
             out = {it.name: self.mask_values(it, out[it.name]) for it in self.items}
         return out
@@ -887,13 +886,13 @@ def _set_time_axis(lib, header, axis: TimeAxis, what: str) -> None:
     check(status, what)
 
 
-class GridWriter:
+class GridWriter(_OpenFile):
     """A gridded data file being written: the header and static items are
     written on creation, then each ``append`` adds one time step of every
     item. ``close`` (or leaving the ``with`` block) brings the header up to
     date and closes the file."""
 
-    def __init__(self, path: str | os.PathLike, items, time_axis: TimeAxis | None, *, file_type: int | None = None,
+    def __init__(self, path: str | os.PathLike, items, time_axis: TimeAxis, *, file_type: int | None = None,
                  title: str = "", app_title: str = "tova", app_version: int = 0, data_type: int = 0,
                  projection: Projection | None = None, delete_values: DeleteValues | None = None,
                  static_items=(), custom_blocks=(), stats_type: int = 1):
@@ -907,7 +906,9 @@ class GridWriter:
             raise TovaError(F_ERR_VALUE, self.path, "a file needs at least one item")
         if len({it.name for it in self.items}) != len(self.items):
             raise TovaError(F_ERR_VALUE, self.path, "item names must differ")
-        self.time_axis = time_axis if time_axis is not None else TimeAxis(0, None)
+        if not isinstance(time_axis, TimeAxis):
+            raise TypeError("a file needs a tova.TimeAxis")
+        self.time_axis = time_axis
         if file_type is None:
             file_type = NEQTIME_FIXEDSPACE if self.time_axis.kind in (2, 4) else EQTIME_FIXEDSPACE
         self.file_type = file_type
@@ -918,8 +919,7 @@ class GridWriter:
         lib = _lib.tova()
         header, file = c_void_p(), c_void_p()
         with _lib.lock:
-            self._lib, self._header, self._file = lib, header, file
-            self._finalizer = weakref.finalize(self, _release, lib, header, file)
+            self._own(lib, header, file)
             try:
                 check(lib.grdHeaderCreate(file_type, _lib.encode(title), _lib.encode(app_title), app_version,
                                           len(self.items), stats_type, byref(header)), self.path)
@@ -956,18 +956,10 @@ class GridWriter:
         for name, values in blocks:
             check(lib.grdAddCustomBlock(h, TYPE_CODES[values.dtype], name, values.size, values.ctypes.data),
                   self.path)
-        if self.time_axis.kind:
-            _set_time_axis(lib, h, self.time_axis, f"{self.path}: time axis")
+        _set_time_axis(lib, h, self.time_axis, f"{self.path}: time axis")
         for item in self.items:
             _set_item(lib, h, lib.grdItemD(h, item.number), item, f"{self.path}: item {item.name!r}")
-        self.delete_values = DeleteValues(lib.grdGetDeleteValFloat(h), lib.grdGetDeleteValDouble(h),
-                                          lib.grdGetDeleteValByte(h), lib.grdGetDeleteValInt(h),
-                                          lib.grdGetDeleteValUnsignedInt(h))
-
-    def _handles(self):
-        if not self._finalizer.alive:
-            raise TovaError(F_ERR_ARGUMENT, self.path, "the file is closed")
-        return self._lib, self._header, self._file
+        self.delete_values = _delete_values_of(lib, h)
 
     def _write_static(self, lib, item: StaticItem, values: np.ndarray) -> None:
         what = f"{self.path}: static item {item.name!r}"
@@ -994,9 +986,7 @@ class GridWriter:
         if axis.is_equidistant:
             return float(axis.equidistant_times(self.steps_written))
         if time is None:
-            if self.file_type in _TIMES_STORED:
-                raise TovaError(F_ERR_ARGUMENT, self.path, f"a {axis.name} time axis needs the time of each step")
-            return float(self.steps_written)
+            raise TovaError(F_ERR_ARGUMENT, self.path, f"a {axis.name} time axis needs the time of each step")
         if isinstance(time, (np.datetime64, _dt.datetime, _dt.date, str)):
             return axis.from_datetime(time)
         return float(time)
@@ -1047,18 +1037,8 @@ class GridWriter:
             finally:
                 self._finalizer()
 
-    @property
-    def closed(self) -> bool:
-        return not self._finalizer.alive
 
-    def __enter__(self) -> "GridWriter":
-        return self
-
-    def __exit__(self, *exc) -> None:
-        self.close()
-
-
-def create(path: str | os.PathLike, items, time_axis: TimeAxis | None = None, **options) -> GridWriter:
+def create(path: str | os.PathLike, items, time_axis: TimeAxis, **options) -> GridWriter:
     """Creates a gridded data file and writes its header and static items;
     returns the writer to append time steps with. ``items`` are ``Item``
     objects (quantity and unit as objects, keys or texts of ``tova.units``).

@@ -55,6 +55,10 @@ def test_time_steps_round_trip(tmp_path):
         for name, want in expected[5].items():
             np.testing.assert_array_equal(step[name], want)
 
+        # The extremes and delete counts the library kept while writing.
+        assert f.item_extremes("water_level") == (0.0, 611.0, samples.N_STEPS)
+        assert f.item_extremes("flag") == (0.0, 18.0, 1)
+
         np.testing.assert_array_equal(f.static_item("bathymetry").values, np.arange(12).reshape(3, 4))
         # Static items read after time steps, and time steps after them.
         np.testing.assert_array_equal(f.read("flag", 6), 18)
@@ -122,6 +126,27 @@ def test_calendar_times_as_datetime64(tmp_path):
         assert f.times[0] == pytest.approx(1439.0 + 59 / 60)
         np.testing.assert_array_equal(f.datetimes, stamps.astype("datetime64[ns]"))
         np.testing.assert_array_equal(f.read("flag"), [0.0, 1.0, 2.0])
+
+
+def test_compressed_items_store_only_the_key_elements(tmp_path):
+    path = tmp_path / "packed.grd"
+    x, y = np.array([0, 3, 1, 2]), np.array([0, 0, 1, 2])  # four of the twelve grid positions
+    items = [it for it in samples.items() if it.name != "discharge"]
+    with tova.create(path, items, TimeAxis.equidistant(60.0), encoding_keys=(x, y)) as w:
+        for t in range(3):
+            w.append({k: v for k, v in samples.values(t).items() if k != "discharge"})
+    with tova.open(path) as f:
+        assert f.compressed and f.encoding_key_length == 4
+        assert f.static_items == []  # the keys are no static items of the caller's
+        level = f.read("water_level", mask=False)
+        inside = np.zeros((3, 4), bool)
+        inside[y, x] = True
+        for t in range(3):
+            np.testing.assert_array_equal(level[t][inside], samples.values(t)["water_level"][inside])
+        assert (level[:, ~inside] == samples.DELETE_FLOAT).all()
+        assert np.isnan(f.read("depth")[:, ~inside]).all()
+        # An item no larger than the keys is stored whole.
+        np.testing.assert_array_equal(f.read("flag", mask=False), [0, 3, 2147483647])
 
 
 def test_refusals_and_lifecycle(tmp_path):

@@ -138,6 +138,12 @@ def test_refusals_raise_with_the_library_status(tmp_path):
         tova.create(tmp_path / "s.grd", [Item("level", "WaterLevel", "m")], TimeAxis.equidistant(0.0))
     assert err.value.status == F_ERR_ARGUMENT
 
+    # A create that fails after the file was made leaves no file behind.
+    with pytest.raises(UnitError):
+        tova.create(tmp_path / "st.grd", [Item("level", "WaterLevel", "m")], TimeAxis.equidistant(60.0),
+                    static_items=[StaticItem("bad", "WaterDepth", "m/s", values=np.zeros(3))])
+    assert not (tmp_path / "st.grd").exists()
+
     # 4-D axes live in memory only: a file refuses them.
     volume = Item("volume", "WaterLevel", "m", axis=Axis.equidistant([2, 2, 2, 3], [0, 0, 0, 5], [1, 1, 1, 0.5]))
     assert volume.shape == (3, 2, 2, 2) and volume.dims == ("t", "z", "y", "x")

@@ -70,6 +70,30 @@ def test_dataset_structure_and_values(sample):
         assert ds.water_level.values.tobytes() == _expected("water_level", False).tobytes()
 
 
+def test_grid_kinds_give_their_coordinates(tmp_path):
+    path = tmp_path / "kinds.grd"
+    nodes_x, nodes_y = np.meshgrid([0.0, 1.0, 2.5], [10.0, 11.0])
+    items = [Item("cells", "WaterDepth", "m", axis=Axis.nonequidistant([[0, 1, 3], [0, 10, 30, 60]])),
+             Item("curved", "WaterDepth", "m", axis=Axis.curvilinear([nodes_x, nodes_y])),
+             Item("stations", "WaterLevel", "m", np.float64, axis=Axis.nonequidistant([[5.0, 7.0, 8.0, 9.0]])),
+             Item("gauge", "WaterLevel", "m")]
+    with tova.create(path, items, TimeAxis.equidistant(10.0)) as w:
+        for t in range(2):
+            w.append([np.full((3, 2), t, np.float32), np.full((1, 2), -t, np.float32),
+                      np.arange(3.0) + t, np.float32(t)])
+    with xr.open_dataset(path, engine=TovaBackendEntrypoint) as ds:
+        assert ds.cells.dims == ("time", "y", "x") and ds.curved.dims == ("time", "y_1", "x_1")
+        np.testing.assert_array_equal(ds.y, [5.0, 20.0, 45.0])
+        np.testing.assert_array_equal(ds.y_bounds, [[0, 10], [10, 30], [30, 60]])
+        assert ds.y.attrs["bounds"] == "y_bounds"
+        assert ds.x_nodes_1.dims == ("y_node_1", "x_node_1")
+        np.testing.assert_array_equal(ds.x_nodes_1, nodes_x)
+        np.testing.assert_array_equal(ds.y_nodes_1, nodes_y)
+        np.testing.assert_array_equal(ds.x_2, [5.0, 7.0, 8.0])  # one point per element
+        assert float(ds.gauge[1]) == 1.0 and float(ds.stations[1, 2]) == 3.0
+        np.testing.assert_array_equal(ds.curved[:, 0, 1], [0.0, -1.0])
+
+
 def test_only_the_selected_time_steps_are_read(sample, monkeypatch):
     positions = samples.count_positions(monkeypatch)
     with xr.open_dataset(sample, engine=TovaBackendEntrypoint) as ds:
@@ -106,12 +130,15 @@ def test_dask_chunks_spread_over_worker_processes(sample):
         assert type(data).__module__.startswith("dask") and data.numblocks == (samples.N_STEPS, 1, 1)
         with distributed.LocalCluster(n_workers=2, processes=True, threads_per_worker=1, dashboard_address=None,
                                       silence_logs=40) as cluster, distributed.Client(cluster) as client:
-            total = ds.water_level.sum("time").compute()
+            with distributed.get_task_stream(client) as stream:
+                total = ds.water_level.sum("time").compute()
             np.testing.assert_allclose(total.values, serial, rtol=1e-6)
-            # The tasks ran in the worker processes, each opening the file itself.
-            assert len(client.scheduler_info()["workers"]) == 2
-            workers = client.run(lambda: os.getpid())
-            assert os.getpid() not in workers.values()
+            # The reads ran in the worker processes: each opened the file
+            # itself (an open file does not travel; only its path does).
+            assert os.getpid() not in client.run(os.getpid).values()
+            workers = set(client.scheduler_info()["workers"])
+            reads = [t for t in stream.data if "water_level" in str(t["key"]) or "open_dataset" in str(t["key"])]
+            assert reads and {t["worker"] for t in reads} <= workers
 
 
 def _registered() -> bool:

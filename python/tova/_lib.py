@@ -308,6 +308,7 @@ TOVA_PROTOTYPES.update({
     "grdGetItemValueType": (i32, [_H, p_i32]),
     "grdGetItemAxisType": (i32, [_H]),
     "grdGetEncodeKeySize": (i32, [_H]),
+    "grdSetEncodeKey": (i32, [_H, p_i32, p_i32, p_i32, i32]),
     "grdIsFileCompressed": (i32, [_H]),
     "grdGetItemStatsGlobal": (i32, [_H, p_double, p_double, p_i32]),
     # Time axes.

@@ -591,10 +591,13 @@ class GridFile(_OpenFile):
     Header attributes: ``file_type`` (and ``file_type_name``), ``title``,
     ``app_title``, ``app_version``, ``data_type``, ``stats_type``,
     ``delete_values``, ``projection`` (None when there is none),
-    ``time_axis``, ``custom_blocks``, ``compressed``; the items in ``items``
+    ``time_axis``, ``custom_blocks``, ``compressed`` (only the elements
+    of the encoding keys are stored; the others read as delete values) and
+    ``encoding_key_length``; the items in ``items``
     (numbered from 1 in the file), the static items in ``static_items``
     (read on first use), the number of time steps in ``n_steps`` and their
-    times in ``times`` (and ``datetimes`` for calendar axes).
+    times in ``times`` (and ``datetimes`` for calendar axes);
+    ``item_extremes`` gives what the header kept of an item's values.
 
     ``mask`` is the default of ``read``: delete values become NaN.
     """
@@ -635,6 +638,7 @@ class GridFile(_OpenFile):
         self.time_axis = _time_axis_of(lib, h)
         self.custom_blocks = _custom_blocks_of(lib, h)
         self.compressed = bool(lib.grdIsFileCompressed(h))
+        self.encoding_key_length = lib.grdGetEncodeKeySize(h) if self.compressed else 0
         self.items = [_item_of(lib, lib.grdItemD(h, n), n) for n in range(1, lib.grdGetNoOfItems(h) + 1)]
 
     def __repr__(self) -> str:
@@ -895,7 +899,7 @@ class GridWriter(_OpenFile):
     def __init__(self, path: str | os.PathLike, items, time_axis: TimeAxis, *, file_type: int | None = None,
                  title: str = "", app_title: str = "tova", app_version: int = 0, data_type: int = 0,
                  projection: Projection | None = None, delete_values: DeleteValues | None = None,
-                 static_items=(), custom_blocks=(), stats_type: int = 1):
+                 static_items=(), custom_blocks=(), stats_type: int = 1, encoding_keys=None):
         self.path = os.fspath(path)
         self.items = list(items)
         for n, item in enumerate(self.items, 1):
@@ -915,6 +919,8 @@ class GridWriter(_OpenFile):
         self.steps_written = 0
         statics = [(s, _values(s.values, s, f"{self.path}: static item {s.name!r}")) for s in static_items]
         blocks = [self._block(b) for b in (custom_blocks.items() if isinstance(custom_blocks, dict) else custom_blocks)]
+        keys = self._keys(encoding_keys)
+        self._failure: TovaError | None = None
 
         lib = _lib.tova()
         header, file = c_void_p(), c_void_p()
@@ -924,12 +930,34 @@ class GridWriter(_OpenFile):
                 check(lib.grdHeaderCreate(file_type, _lib.encode(title), _lib.encode(app_title), app_version,
                                           len(self.items), stats_type, byref(header)), self.path)
                 self._fill_header(lib, header, data_type, projection, delete_values, blocks)
+                if keys:
+                    pointers = [_lib.as_pointer(k, c_int32) if k is not None else None for k in keys]
+                    check(lib.grdSetEncodeKey(header, *pointers, len(keys[0])), self.path)
                 check(lib.grdFileCreate(_lib.encode(path), header, byref(file)), self.path)
                 for item, values in statics:
                     self._write_static(lib, item, values)
             except BaseException:
+                created = bool(file.value)
                 self._finalizer()
+                if created:  # a failed create leaves no half-made file behind
+                    try:
+                        os.remove(self.path)
+                    except OSError:
+                        pass
                 raise
+
+    def _keys(self, keys) -> list | None:
+        """The x, y and z encoding keys (the z key, or the y and z keys, may
+        be left out or None) as int32 arrays of one length."""
+        if keys is None:
+            return None
+        keys = list(keys) + [None] * (3 - len(keys))
+        if len(keys) != 3 or keys[0] is None:
+            raise TovaError(F_ERR_VALUE, self.path, "encoding keys are x, y and z keys, the x key at least")
+        keys = [None if k is None else np.ascontiguousarray(k, dtype=np.int32).reshape(-1) for k in keys]
+        if len({k.size for k in keys if k is not None}) != 1 or keys[0].size == 0:
+            raise TovaError(F_ERR_SIZE, self.path, "the encoding keys need one common, non-zero length")
+        return keys
 
     @staticmethod
     def _block(entry) -> tuple:
@@ -1013,10 +1041,15 @@ class GridWriter(_OpenFile):
                   for v, it in zip(values, self.items)]
         t = self._time(time)
         lib, h, f = self._handles()
+        if self._failure is not None:
+            raise TovaError(self._failure.status, self.path, f"an earlier time step failed: {self._failure}")
         with _lib.lock:
             for item, array in zip(self.items, arrays):
-                check(lib.grdWriteItemTimeStep(h, f, t, array.ctypes.data),
-                      f"{self.path}: item {item.name!r} of time step {step}")
+                status = lib.grdWriteItemTimeStep(h, f, t, array.ctypes.data)
+                if status:
+                    # The time step is incomplete: later steps would land on the wrong items.
+                    self._failure = TovaError(status, f"{self.path}: item {item.name!r} of time step {step}")
+                    raise self._failure
         self.steps_written += 1
 
     def flush(self) -> None:
@@ -1046,7 +1079,10 @@ def create(path: str | os.PathLike, items, time_axis: TimeAxis, **options) -> Gr
     others), ``title``, ``app_title``, ``app_version``, ``data_type``,
     ``projection`` (a ``Projection`` or its text), ``delete_values``
     (``DeleteValues``), ``static_items`` (``StaticItem`` objects),
-    ``custom_blocks`` (name -> array, or pairs), ``stats_type`` (1-3)."""
+    ``custom_blocks`` (name -> array, or pairs), ``stats_type`` (1-3),
+    ``encoding_keys`` (x, y and z grid indices of the elements to store:
+    every item larger than the keys then stores only those elements, taken
+    from the full arrays given to ``append``)."""
     return GridWriter(path, items, time_axis, **options)
 
 

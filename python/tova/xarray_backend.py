@@ -26,6 +26,7 @@ import xarray as xr
 from xarray.backends import BackendArray, BackendEntrypoint, CachingFileManager
 from xarray.core import indexing
 
+from .errors import TovaError
 from .grd import Axis, GridFile
 
 # The first bytes of a gridded data file: the record-file tag and the
@@ -111,7 +112,10 @@ def _time_coordinate(f: GridFile, decode_times: bool) -> xr.Variable:
     axis = f.time_axis
     attrs = {"time_axis": axis.name, "standard_name": "time"}
     if axis.is_calendar and decode_times and axis.start_date is not None:
-        return xr.Variable(("time",), f.datetimes, attrs)
+        try:
+            return xr.Variable(("time",), f.datetimes, attrs)
+        except TovaError:  # a time unit the unit library cannot convert: the numbers as they are
+            pass
     if axis.unit is not None:
         unit = _CF_TIME_UNITS.get(axis.unit_name, axis.unit_name)
         attrs["units"] = f"{unit} since {axis.start_date}" if axis.is_calendar else unit

@@ -846,6 +846,18 @@ int32_t TOVA_CALL rcfSkip(FileHandle h) {
     int64_t n = 0;
     if (t >= 1) {
         n = static_cast<int64_t>(recordBytes64(t, count)) + 5;
+        if (!fitsInFile(h, static_cast<uint64_t>(n))) {
+            // The record runs past the end of the file. Seeking over it would
+            // leave the stream far beyond the end (where a write would make a
+            // file of the size a damaged count claims): the skip stops at the
+            // end instead and fails, as a short skip does.
+            h->pendingSkip = 0;
+            resetPeek(h);
+            streamSeek(h->stream, 0, SEEK_END);
+            h->lastOp = 0;
+            RCF_FAIL(h, F_ERR_SEEK);
+            return t;
+        }
     } else if (t == RCF_BLOCK) {
         n = 3;
     } else if (t < 0) {

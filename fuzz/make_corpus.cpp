@@ -355,6 +355,8 @@ int main(int argc, char** argv) {
     }
     g_out = argv[1];
     fs::create_directories(g_out);
+    // Each target's seeds; a new target (fuzz_grd for the gridded data files)
+    // adds its own generator here.
     rcfSeeds();
     xfsSeeds();
     vreSeeds();

@@ -131,6 +131,12 @@ struct GrdItem {
     float origin[4] = {0, 0, 0, 0};
     float step[4] = {0, 0, 0, 0};
     GrdArray<double> coords[3];
+    // NeqD1 on disk holds x, y, z per point (3 x size floats) where the model
+    // keeps size + 1 x boundaries: the points of an axis read from a file are
+    // kept here (diskPointCount points) so that a rewrite gives back their y
+    // and z. Null for an axis set in memory; cleared by every axis setter.
+    GrdArray<float> diskPoints;
+    int32_t diskPointCount = 0;
 
     int32_t axisConvMode = 0;  // axis unit conversion (set and get of axis values)
     int32_t axisConvUnit = 0;

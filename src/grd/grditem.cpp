@@ -279,6 +279,8 @@ int32_t setAxis(ItemHandle item, int32_t axisType, int32_t unit, const AxisIn& i
         item->step[d] = 0.0f;
     }
     for (int32_t d = 0; d < 3; ++d) item->coords[d] = std::move(copies[d]);
+    item->diskPoints.reset();  // the points read from a file belonged to the old axis
+    item->diskPointCount = 0;
     if (grdAxisFamily(axisType) == GrdAxisFamily::Equidistant) {
         for (int32_t d = 0; d < dirs; ++d) {
             item->origin[d] = convertFloat(item, in.origins[d], Direction::AxisSet);

@@ -47,6 +47,12 @@ struct RcfFile {
     // seen so far, refreshed on demand to bound what a record may claim.
     std::unique_ptr<char[]> ioBuffer;
     int64_t knownSize = 0;
+    // For the gridded-data layer: the offset just after the block that starts
+    // the dynamic data, once it has been written or found (-1 before), and
+    // the measured byte length of one time step (0 before). The start never
+    // moves while the file is open, so positioning can go there at once.
+    int64_t dynamicStart = -1;
+    int64_t timeStepLength = 0;
 
     RcfFile() = default;
     RcfFile(const RcfFile&) = delete;
@@ -71,6 +77,8 @@ int32_t rcfFileOpenEdit(const char* path, FileHandle* out, rcfAppIdent appIdent,
 int32_t rcfFileOpen(const char* path, FileHandle* out, const char* mode, rcfAppIdent appIdent,
                     uint32_t* appTagOut);
 void rcfSeekAppBase(FileHandle h);
+// Monotonic milliseconds, the clock of openClock (flush throttles compare against it).
+uint32_t rcfClockMs();
 // This layer's own status reporter (module "rcf"); returns code.
 int32_t rcfReportError(int32_t code, const char* module, int32_t line);
 

@@ -1,0 +1,110 @@
+// Write failures: under a file size limit (a full disk behaves alike) every
+// lost write comes back as a status, never silently, and a close that
+// cannot complete the file refuses to close it. Each case runs in a forked
+// child with RLIMIT_FSIZE set and SIGXFSZ ignored, and sends its statuses
+// back through a pipe.
+#ifndef _WIN32  // file size limits and fork are POSIX
+
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <cstdint>
+#include <filesystem>
+#include <functional>
+#include <vector>
+
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include "test_lifecycle_support.h"
+
+using namespace grdtest;
+
+namespace {
+
+constexpr rlim_t kLimit = 64 * 1024;
+
+std::vector<int32_t> inLimitedChild(rlim_t limit, const std::function<std::vector<int32_t>()>& body) {
+    int fds[2];
+    if (pipe(fds) != 0) return {};
+    const pid_t pid = fork();
+    if (pid == 0) {
+        ::close(fds[0]);
+        std::signal(SIGXFSZ, SIG_IGN);
+        const rlimit rl{limit, limit};
+        setrlimit(RLIMIT_FSIZE, &rl);
+        const std::vector<int32_t> results = body();
+        const ssize_t bytes = static_cast<ssize_t>(results.size() * sizeof(int32_t));
+        const bool sent = write(fds[1], results.data(), static_cast<size_t>(bytes)) == bytes;
+        _exit(sent ? 0 : 1);  // no exit handlers: the child owns nothing of the parent's
+    }
+    ::close(fds[1]);
+    std::vector<int32_t> results;
+    int32_t value = 0;
+    while (read(fds[0], &value, sizeof value) == static_cast<ssize_t>(sizeof value)) results.push_back(value);
+    ::close(fds[0]);
+    int wstatus = 0;
+    waitpid(pid, &wstatus, 0);
+    EXPECT_TRUE(WIFEXITED(wstatus) && WEXITSTATUS(wstatus) == 0);
+    return results;
+}
+
+class WriteFailureTest : public FileTest {
+protected:
+    // Creates path and writes one float static item of n elements; gives the
+    // statuses of the write and of the close, and whether the file was still
+    // open after the close (it is then released through the record layer).
+    std::vector<int32_t> writeAndClose(const std::string& path, int32_t n) {
+        std::vector<int32_t> r;
+        if (grdFileCreate(path.c_str(), header_, &file_) != 0) return {-1};
+        StaticItem item;
+        grdSetItemInfo(header_, item.get(), QTY_ITEM_UNDEFINED, "big", 0, RCF_FLOAT);
+        grdSetItemAxisEqD1(item.get(), 0, n, 0.0f, 1.0f);
+        const std::vector<float> values(static_cast<size_t>(n), 1.0f);
+        r.push_back(grdStaticWrite(item.get(), file_, values.data()));
+        r.push_back(grdFileClose(header_, &file_));
+        r.push_back(file_ != nullptr ? 1 : 0);
+        if (file_ != nullptr) rcfFileClose(&file_);
+        return r;
+    }
+};
+
+TEST_F(WriteFailureTest, WriteBeyondTheLimitIsAStatus) {
+    makeFileHeader();
+    // Larger than the stream buffer: the write itself fails.
+    const std::vector<int32_t> big =
+        inLimitedChild(kLimit, [&] { return writeAndClose(dir_.file("big.grd"), 1 << 19); });
+    ASSERT_EQ(big.size(), 3u);
+    EXPECT_EQ(big[0], 2002);
+    EXPECT_NE(big[1], 0);  // never a successful close of an incomplete file
+}
+
+TEST_F(WriteFailureTest, BufferedDataThatCannotReachTheDiskFailsTheClose) {
+    makeFileHeader();
+    // Fits the stream buffer, so the write seems to succeed; the close must not.
+    const std::vector<int32_t> small =
+        inLimitedChild(kLimit, [&] { return writeAndClose(dir_.file("small.grd"), 40000); });
+    ASSERT_EQ(small.size(), 3u);
+    EXPECT_EQ(small[0], 0);
+    EXPECT_NE(small[1], 0);
+    EXPECT_EQ(small[2], 1);  // the close refused: the file stayed open
+}
+
+TEST_F(WriteFailureTest, CreateThatCannotWriteItsHeaderLeavesNothing) {
+    makeFileHeader();
+    const std::string path = dir_.file("tiny.grd");
+    const std::vector<int32_t> r = inLimitedChild(100, [&] {
+        FileHandle file = reinterpret_cast<FileHandle>(0x1);
+        const int32_t status = grdFileCreate(path.c_str(), header_, &file);
+        return std::vector<int32_t>{status, file == nullptr ? 1 : 0};
+    });
+    ASSERT_EQ(r.size(), 2u);
+    EXPECT_NE(r[0], 0);
+    EXPECT_EQ(r[1], 1);
+    EXPECT_FALSE(std::filesystem::exists(path));
+}
+
+}  // namespace
+
+#endif  // _WIN32

@@ -475,9 +475,9 @@ TOVA_API int32_t TOVA_CALL grdGetItemStatsGlobal(ItemHandle item, double* minimu
 /* Loads the plug-in of the header's data type for file. Returns 0, or the
  * non-zero status that the plug-in's last description call returned (the
  * plug-in is loaded in both cases); -1 when refused: the file is not open for
- * reading only, a plug-in is already loaded, a required entry point is
- * missing, its initialisation fails or an axis it describes is out of range
- * (the header is left unchanged); -2 when the data type is 0; -3 when the
+ * reading only, a plug-in is already loaded, the cursor stands inside a time
+ * step, a required entry point is missing, its initialisation fails or an
+ * axis it describes is out of range (the header is left unchanged); -2 when the data type is 0; -3 when the
  * library cannot be loaded. -1, -2 and -3 are returned, never reported.
  * Item handles taken before a successful call are no longer valid. */
 TOVA_API int32_t TOVA_CALL grdEnablePlugin(HeaderHandle header, FileHandle file);

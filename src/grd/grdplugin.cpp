@@ -219,7 +219,8 @@ int32_t countOf(double value) {
 }
 
 // Builds the plug-in's item k from its copy. *last receives the status of
-// every description call made. Returns 0, kRefused, or a failure status.
+// every description call made. Returns 0, kRefused, or a failure status
+// (reported).
 int32_t describeItem(GrdHeader* header, const EntryPoints& e, int32_t k, GrdItem& item, int32_t* last) {
     // A derived item, or one beyond the file's items, keeps nothing of the
     // item it was copied from but its axis and settings: no texts, links or
@@ -240,8 +241,8 @@ int32_t describeItem(GrdHeader* header, const EntryPoints& e, int32_t k, GrdItem
         item.itemType = itemType;
         item.unit = unit;
         item.dataType = dataType;
-        if (name != nullptr && !item.name.assign(name)) return F_ERR_MEMORY;
-        if (unitName != nullptr && !item.unitText.assign(unitName)) return F_ERR_MEMORY;
+        if ((name != nullptr && !item.name.assign(name)) || (unitName != nullptr && !item.unitText.assign(unitName)))
+            return grdReportError(header, nullptr, 0, F_ERR_MEMORY, kModule, __LINE__);
     }
 
     if (e.getItemValueType != nullptr) {
@@ -316,8 +317,7 @@ int32_t buildItems(GrdHeader* header, const EntryPoints& e, int32_t m, std::uniq
         }
         item.owner = header;
         const int32_t status = describeItem(header, e, k, item, last);
-        if (status == kRefused) return status;
-        if (status != F_NO_ERROR) return grdReportError(header, nullptr, 0, status, kModule, __LINE__);
+        if (status != F_NO_ERROR) return status;
     }
     out = std::move(items);
     return F_NO_ERROR;
@@ -328,6 +328,8 @@ int32_t enablePlugin(GrdHeader* header, FileHandle file) {
     // allowed; tova has no legacy translator.)
     if (file == nullptr || file->readOnly == 0) return kRefused;
     if (header->extension.data != nullptr || header->extReentrant != 0) return kRefused;  // one at a time
+    // The plug-in takes over from the first item of a time step on.
+    if (header->nextItem != 0) return kRefused;
     if (header->dataType == 0) return kNoDataType;
 
     std::unique_ptr<PluginState> state(grdNew<PluginState>());

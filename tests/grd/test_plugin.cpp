@@ -66,15 +66,21 @@ TEST_F(RecorderTest, LoadsTheLibraryOfTheDataTypesAbsoluteValue) {
 }
 
 TEST_F(RecorderTest, RefusalsAreReturnedNotReported) {
-    writeAndOpen(0, 1);
+    writeAndOpen(0, 2);
     EXPECT_EQ(grdEnablePlugin(header_, file_), -2);  // data type 0
     ASSERT_EQ(grdSetDataType(header_, 999), 0);
     EXPECT_EQ(grdEnablePlugin(header_, file_), -3);  // no such library
     ASSERT_EQ(grdSetDataType(header_, 901), 0);
     EXPECT_EQ(grdEnablePlugin(header_, nullptr), -1);
+    ASSERT_EQ(grdSkipItem(header_, file_), 0);
+    EXPECT_EQ(grdEnablePlugin(header_, file_), -1);  // inside a time step
     EXPECT_TRUE(reports().empty());
     EXPECT_FALSE(pluginLoaded(901));
     EXPECT_EQ(grdGetNoOfItems(header_), 2);
+    // From the next time step on it can take over.
+    ASSERT_EQ(grdSkipItem(header_, file_), 0);
+    ASSERT_EQ(grdEnablePlugin(header_, file_), 0);
+    expectTimeStep(1);
 
     // A file open for editing is refused before anything is loaded.
     ASSERT_EQ(grdFileClose(header_, &file_), 0);
@@ -136,6 +142,28 @@ TEST_F(RecorderTest, RefusedPluginLeavesTheHeaderUnchanged) {
     std::vector<float> v;
     ASSERT_EQ(read(v), 0);
     EXPECT_EQ(v, (std::vector<float>{0.0f, 0.5f, 1.0f}));
+}
+
+TEST_F(RecorderTest, MemoryFailureWhileEnablingLeavesTheHeaderUnchanged) {
+    writeAndOpen(901, 1);
+    PluginProbe probe(901);
+    int32_t status = F_ERR_MEMORY;
+    int32_t nth = 1;
+    for (; status == F_ERR_MEMORY && nth < 100; ++nth) {
+        probe.clear();
+        grdTestFailAllocation(nth);
+        status = grdEnablePlugin(header_, file_);
+        grdTestFailAllocation(0);
+        if (status != F_ERR_MEMORY) break;
+        EXPECT_EQ(takeCodes(), Codes{F_ERR_MEMORY}) << nth;
+        EXPECT_EQ(grdGetNoOfItems(header_), 2);
+        EXPECT_EQ(header_->extension.data, nullptr);
+        const std::string log = probe.log();
+        EXPECT_TRUE(log.empty() || log == "IT") << nth << ": " << log;  // terminated once initialised
+    }
+    EXPECT_GT(nth, 3);  // several allocations could fail
+    ASSERT_EQ(status, 0);
+    expectTimeStep(0);
 }
 
 TEST_F(RecorderTest, OffersCopiesOfTheFileItemsAndTheDescribedDerivedItem) {

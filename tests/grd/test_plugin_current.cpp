@@ -154,11 +154,12 @@ TEST_F(CurrentTest, SkipsAndPositioning) {
 
 TEST_F(CurrentTest, UnitConversionsOfTheCallerApplyOnceToWhatThePluginDelivers) {
     writeAndOpen(7);
-    ASSERT_EQ(grdEnablePlugin(header_, file_), 0);
     const int32_t centimetrePerSecond = unitTag("cm/s");
     const int32_t knot = unitTag("knot");
-    // u in cm/s: the plug-in still derives from m/s; speed in knots.
+    // u in cm/s, asked for before the plug-in is loaded: the plug-in still
+    // derives from m/s. Speed in knots.
     ASSERT_EQ(grdSetItemUnitConversion(grdItemD(header_, 2), 2, centimetrePerSecond), 0);
+    ASSERT_EQ(grdEnablePlugin(header_, file_), 0);
     ASSERT_EQ(grdSetItemUnitConversion(grdItemD(header_, 4), 2, knot), 0);
     std::vector<float> f;
     ASSERT_EQ(read(f), 0);

@@ -1,0 +1,58 @@
+// Structural check of record files. The walk in check.cpp goes through the
+// file header and every record and block mark with the public record-file
+// API; a KindCheck adds the rules of one kind of file (what its blocks hold,
+// the sequence of its records) and loads the file through its own API.
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "tova_cli.h"
+
+namespace tova_cli {
+
+// The first problem found: where it is and a one-line explanation.
+struct Problem {
+    int64_t offset = 0;
+    std::string what;
+};
+
+// One record, block start or terminator met by the walk.
+struct Mark {
+    int64_t offset = 0;
+    int32_t type = 0;    // simple type 1-7, RCF_BLOCK or RCF_TERMINATOR
+    uint32_t count = 0;  // elements of a data record; identifier of a block start
+};
+
+class KindCheck {
+public:
+    virtual ~KindCheck() = default;
+    // Called for every mark in file order, after the walk has found it sound;
+    // inBlock tells whether a block is open (for a terminator: the one it ends).
+    virtual std::optional<Problem> mark(const Mark& m, bool inBlock) {
+        (void)m;
+        (void)inBlock;
+        return std::nullopt;
+    }
+    // Called once the whole file has walked clean.
+    virtual std::optional<Problem> finish() = 0;
+    // Remarks for the report that are not problems.
+    const std::vector<std::string>& notes() const { return notes_; }
+
+protected:
+    std::vector<std::string> notes_;
+};
+
+std::unique_ptr<KindCheck> vreCheck(const RecordFileInfo& file);
+std::unique_ptr<KindCheck> xsecCheck(const RecordFileInfo& file);
+
+// "double record of 3 elements" and the like.
+std::string recordText(int32_t type, uint32_t count);
+
+// The noun phrase with "a" or "an" before it.
+std::string withArticle(const std::string& phrase);
+
+}  // namespace tova_cli

@@ -64,8 +64,12 @@ private:
 
 class PluginTest : public FileTest {
 protected:
-    // Opens path for reading (the fixture's header and file).
-    void open(const std::string& path) { openRead(path); }
+    // Opens path for reading into the fixture's header and file (closing
+    // the file that was open).
+    void open(const std::string& path) {
+        if (file_ != nullptr) rcfFileClose(&file_);
+        openRead(path);
+    }
 
     // Reads the item under the cursor into a buffer of its element count;
     // returns the status, the time through *time.

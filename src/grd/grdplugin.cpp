@@ -19,6 +19,9 @@
 #include <utility>
 
 #ifdef _WIN32
+#ifndef NOMINMAX
+#define NOMINMAX
+#endif
 #include <windows.h>
 #else
 #include <dlfcn.h>
@@ -250,7 +253,8 @@ int32_t describeItem(GrdHeader* header, const EntryPoints& e, int32_t k, GrdItem
         if (valueType >= 0 && valueType <= 3) item.valueType = valueType;
     }
 
-    // Taken after the axis: a new element count starts the statistics afresh.
+    // Preset statistics are applied after the axis, whose element count may
+    // start the statistics afresh.
     double minimum = item.globalMin, maximum = item.globalMax;
     int32_t deletes = countOf(item.globalDeletes);
     bool presetStats = false;

@@ -221,6 +221,34 @@ int32_t staticItemFollows(GrdHeader* header, FileHandle file, bool* found) {
     return error > F_EOF ? error : F_NO_ERROR;
 }
 
+// Moves the cursor within its time step to item `wanted` (0-based, after
+// it) in one move of the file position, where each item's record length
+// follows from the header: past the time-step block (next item above 0),
+// fixed space (file types 1 and 4), no plug-in in between, every item
+// passed one that grdSkipItem would pass. Returns false, having done
+// nothing, otherwise: the caller skips item by item (and meets the
+// report). A random item is then found in time independent of its number.
+bool skipItemsAtOnce(GrdHeader* header, FileHandle file, int32_t wanted) {
+    if (header->nextItem <= 0 || header->nextItem >= wanted || wanted > header->noOfItems) return false;
+    if (header->fileType != F_EQTIME_FIXEDSPACE_ALLITEMS && header->fileType != F_NEQTIME_FIXEDSPACE_ALLITEMS)
+        return false;
+    if (grdPluginRoutes(header)) return false;
+    uint64_t bytes = 0;
+    for (int32_t i = header->nextItem; i < wanted; ++i) {
+        const GrdItem* item = &header->items[i];
+        const int64_t elements = grdItemElementCount(item);
+        const int64_t used = grdItemUsedElementCount(item);
+        const int64_t size = grdSimpleTypeSize(item->dataType);
+        if (elements <= 0 || used <= 0 || size <= 0) return false;
+        const int64_t limit = static_cast<int64_t>(UINT32_MAX) / size;
+        if (elements > limit || used > limit) return false;
+        bytes += 5 + static_cast<uint64_t>(used * size);  // the record's header and its elements
+    }
+    rcfSkipDeferred64(file, bytes);
+    header->nextItem = wanted;
+    return true;
+}
+
 // Passes over the next static item without reading its values: the blocks
 // of its item record up to and including the 40001 block with its values.
 // *found is false when no static item follows (the static part is over).
@@ -329,6 +357,7 @@ int32_t TOVA_CALL grdFindItemDynamic(HeaderHandle header, FileHandle file, int32
         // Within the right time step and before the item: skip forward only.
         if (!(inStep && header->nextItem < wanted)) status = gotoTimeStep(header, file, timeStep);
         while (status == F_NO_ERROR && header->nextItem != wanted) {
+            if (skipItemsAtOnce(header, file, wanted)) break;
             const int32_t before = header->nextItem;
             status = grdSkipItem(header, file);
             // The item-varying file types do not move the cursor on a skip.

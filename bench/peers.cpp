@@ -586,14 +586,16 @@ public:
         nc(nc_close(id), "nc_close");
         return nvars;
     }
-    // The chunk shape netCDF-4 chose for a grid variable, as "1 x 1000 x 1000".
+    // The chunk shape netCDF-4 chose for the first item's variable, as
+    // "1 x 1000 x 1000".
     static std::string chunking(const std::string& path) {
-        int id = -1, storage = 0;
+        int id = -1, var = 0, storage = 0;
         size_t chunks[3] = {};
         nc(nc_open(path.c_str(), NC_NOWRITE, &id), "nc_open");
+        nc(nc_inq_varid(id, itemName(0).c_str(), &var), "nc_inq_varid");
         int ndims = 0;
-        nc(nc_inq_varndims(id, 0, &ndims), "nc_inq_varndims");
-        nc(nc_inq_var_chunking(id, 0, &storage, chunks), "nc_inq_var_chunking");
+        nc(nc_inq_varndims(id, var, &ndims), "nc_inq_varndims");
+        nc(nc_inq_var_chunking(id, var, &storage, chunks), "nc_inq_var_chunking");
         nc_close(id);
         std::string out;
         for (int d = 0; d < ndims && d < 3; ++d) out += (d ? " x " : "") + std::to_string(chunks[d]);

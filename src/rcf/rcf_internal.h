@@ -63,6 +63,10 @@ struct RcfFile {
 
 constexpr uint32_t kRcfVersionCurrent = 104;
 constexpr size_t kRcfStreamBufferSize = 256 * 1024;
+// Files opened for reading only get a smaller buffer: every jump to a far
+// position refills the whole buffer, and readers are the ones that jump
+// (small records still cost one system call per thousands of them).
+constexpr size_t kRcfReadBufferSize = 64 * 1024;
 
 // Handler form of this layer's own table (slots for 1000 and 2000-2019).
 using rcfErrorHandler = int32_t (*)(int32_t code, const char* module, int32_t line);

@@ -564,6 +564,8 @@ int32_t rcfFileOpenEdit(const char* path, FileHandle* out, rcfAppIdent appIdent,
 
 uint32_t rcfClockMs() { return clockMs(); }
 
+bool rcfFits(FileHandle h, uint64_t bytes) { return h != nullptr && fitsInFile(h, bytes); }
+
 void rcfSeekAppBase(FileHandle h) {
     if (h != nullptr) seekTo(h, h->appBase, 0);
 }

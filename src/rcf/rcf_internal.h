@@ -90,6 +90,10 @@ int32_t rcfReportError(int32_t code, const char* module, int32_t line);
 int32_t rcfReadRaw(void* buffer, uint32_t elementSize, uint32_t count, FileHandle h, int32_t keepPeek);
 void rcfWriteRaw(void* buffer, uint32_t elementSize, uint32_t count, FileHandle h);
 
+// Whether bytes more can be read from the logical position: the check made
+// before anything is allocated for what a file claims to hold.
+bool rcfFits(FileHandle h, uint64_t bytes);
+
 // Record-header look-ahead and positioning.
 int32_t rcfPeekHeader(FileHandle h, uint32_t* count, uint32_t* headerLength);
 void rcfUnpeekHeader(FileHandle h);

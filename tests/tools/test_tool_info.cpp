@@ -190,11 +190,11 @@ TEST(ToolInfo, CrossSectionFileAsTextAndJson) {
 TEST(ToolInfo, GriddedUnknownAndForeignOrderFilesShowTheirRecordFileHeader) {
     testutil::TempDir dir;
     const std::string grd = dir.file("a.grd");
-    tooltest::writeGridLikeFile(grd);
+    tooltest::writeGridFile(grd);
     const tooltest::Run text = runTova({"info", grd});
     ASSERT_EQ(text.exitCode, 0);
     EXPECT_NE(text.out.find("kind            grd\n"), std::string::npos) << text.out;
-    EXPECT_NE(text.out.find("grd:\n  details  not available yet"), std::string::npos) << text.out;
+    EXPECT_NE(text.out.find("grd:\n  fileType "), std::string::npos) << text.out;
     nlohmann::json doc = infoJson(grd);
     EXPECT_EQ(doc["applicationTag"], "GRD_");
     EXPECT_EQ(doc["rcfBase"], 82);

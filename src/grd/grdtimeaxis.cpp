@@ -285,9 +285,21 @@ int32_t TOVA_CALL _grdGetTimeAxisSpan(HeaderHandle header, FileHandle file, doub
             return trace.done(F_NO_ERROR);
         }
         case F_TM_NEQ_AXIS:
-        case F_CAL_NEQ_AXIS:
-            // Needs the last time step's time from the file: completed by the data layer.
-            return trace.done(grdReportError(header, file, 0, F_ERR_VALUE, kModule, __LINE__));
+        case F_CAL_NEQ_AXIS: {
+            // The time of the last time step, read from the file; the file is
+            // left at the start of its static data.
+            const GrdTimeValues& v = axis.type == F_TM_NEQ_AXIS ? axis.time : axis.calendar;
+            const double start = v.start;
+            int32_t s = grdFindTimeStep(header, file, v.timeSteps - 1);
+            double last = 0.0;
+            if (s == F_NO_ERROR) s = grdReadItemTimeStep(header, file, &last, nullptr);
+            if (s == F_NO_ERROR) s = grdFindBlockStatic(header, file);
+            if (s != F_NO_ERROR) return trace.done(s);
+            // With the modify-times switch on, the read gives the time relative
+            // to the start already.
+            if (span) *span = header->modifyTimes != 0 ? last : last - start;
+            return trace.done(F_NO_ERROR);
+        }
         default:
             return trace.done(F_NO_ERROR);
     }

@@ -37,11 +37,31 @@ constexpr unsigned char kEndOfText = 0x1A;
 constexpr unsigned char kBlockStart = 0xFE;
 constexpr uint32_t kStampBlockBytes = 48;  // stamps, versions and two reserved words
 constexpr int kPeekSlots = 4;
+// Records of at most this many element bytes take the short way: written
+// with their header in one stream call, read without asking the file's length.
+constexpr uint64_t kSmallRecordBytes = 64;
 
 #define RCF_REPORT(code) rcfReportError((code), kModule, __LINE__)
 #define RCF_FAIL(h, code) ((h)->error = RCF_REPORT(code))
 
 // ---- Platform: 64-bit stream positions, file length, local time ----------
+
+// A file is used by one thread at a time, so the transfers take the stream
+// functions that skip the stream's lock where the C library has them: for
+// small records the lock costs as much as the copy.
+#if defined(_WIN32)
+inline size_t streamRead(void* p, size_t n, std::FILE* f) { return _fread_nolock(p, 1, n, f); }
+inline size_t streamWrite(const void* p, size_t n, std::FILE* f) { return _fwrite_nolock(p, 1, n, f); }
+inline int streamGetc(std::FILE* f) { return _getc_nolock(f); }
+#elif defined(__GLIBC__)
+inline size_t streamRead(void* p, size_t n, std::FILE* f) { return fread_unlocked(p, 1, n, f); }
+inline size_t streamWrite(const void* p, size_t n, std::FILE* f) { return fwrite_unlocked(p, 1, n, f); }
+inline int streamGetc(std::FILE* f) { return getc_unlocked(f); }
+#else
+inline size_t streamRead(void* p, size_t n, std::FILE* f) { return std::fread(p, 1, n, f); }
+inline size_t streamWrite(const void* p, size_t n, std::FILE* f) { return std::fwrite(p, 1, n, f); }
+inline int streamGetc(std::FILE* f) { return getc_unlocked(f); }
+#endif
 
 #ifdef _WIN32
 int streamSeek(std::FILE* f, int64_t offset, int whence) { return _fseeki64(f, offset, whence); }
@@ -209,7 +229,7 @@ void skipBytes(RcfFile* h, int64_t n) {
     resetPeek(h);
     if (h->lastOp >= 0 && n >= 1 && n < static_cast<int64_t>(sizeof(h->scratch))) {
         const auto want = static_cast<size_t>(n);
-        if (std::fread(h->scratch, 1, want, h->stream) < want) RCF_FAIL(h, F_ERR_SEEK);
+        if (streamRead(h->scratch, want, h->stream) < want) RCF_FAIL(h, F_ERR_SEEK);
         h->lastOp = 1;
     } else {
         if (streamSeek(h->stream, n, SEEK_CUR) != 0) RCF_FAIL(h, F_ERR_SEEK);
@@ -230,6 +250,30 @@ bool fitsInFile(RcfFile* h, uint64_t bytes) {
     if (h->lastOp < 0) std::fflush(h->stream);
     h->knownSize = std::max(h->knownSize, streamLength(h->stream));
     return need <= h->knownSize;
+}
+
+// Reads size bytes of a record header for the look-ahead (keepPeek), taking
+// them byte by byte from the stream's buffer when nothing has to move first
+// (a call of fread for each of the one to five header bytes would cost more
+// than a small record itself). Same results and errors as rcfReadRaw.
+bool readPeekBytes(RcfFile* h, void* out, uint32_t size) {
+    if (h->lastOp < 0 || h->pendingSkip != 0) return rcfReadRaw(out, size, 1, h, 1) != 0;
+    auto* p = static_cast<unsigned char*>(out);
+    for (uint32_t i = 0; i < size; ++i) {
+        const int c = streamGetc(h->stream);
+        h->lastOp = 1;
+        if (c == EOF) {
+            if (std::feof(h->stream)) {
+                h->error = F_EOF;
+            } else {
+                RCF_FAIL(h, F_ERR_READ);
+            }
+            return false;
+        }
+        p[i] = static_cast<unsigned char>(c);
+    }
+    if (h->swapBytes != 0) swapElements(out, size, 1);
+    return true;
 }
 
 // ---- Writing -------------------------------------------------------------
@@ -256,7 +300,7 @@ bool beginWrite(RcfFile* h) {
 
 void putBytes(RcfFile* h, const void* data, size_t n) {
     if (h->error != 0 || n == 0) return;
-    if (std::fwrite(data, 1, n, h->stream) != n) RCF_FAIL(h, F_ERR_WRITE);
+    if (streamWrite(data, n, h->stream) != n) RCF_FAIL(h, F_ERR_WRITE);
 }
 
 // Writes count elements; for a foreign-order file they are reversed in a
@@ -547,7 +591,7 @@ int32_t rcfReadRaw(void* buffer, uint32_t elementSize, uint32_t count, FileHandl
         RCF_FAIL(h, F_ERR_READ);
         return 0;
     }
-    const size_t got = bytes != 0 ? std::fread(buffer, 1, static_cast<size_t>(bytes), h->stream) : 0;
+    const size_t got = bytes != 0 ? streamRead(buffer, static_cast<size_t>(bytes), h->stream) : 0;
     h->lastOp = 1;
     if (got < bytes) {
         if (std::feof(h->stream)) {
@@ -582,16 +626,16 @@ int32_t rcfPeekHeader(FileHandle h, uint32_t* count, uint32_t* headerLength) {
     uint32_t entryLength = 0;
     if (h->error == 0) {
         unsigned char mark = 0;
-        if (rcfReadRaw(&mark, 1, 1, h, 1)) {
+        if (readPeekBytes(h, &mark, 1)) {
             type = static_cast<int8_t>(mark);
             entryLength = 1;
             if (type > 0) {
                 uint32_t n = 0;
-                if (rcfReadRaw(&n, 4, 1, h, 1)) entryCount = n;
+                if (readPeekBytes(h, &n, 4)) entryCount = n;
                 entryLength = 5;
             } else if (mark == kBlockStart) {
                 uint16_t id = 0;
-                if (rcfReadRaw(&id, 2, 1, h, 1)) entryCount = id;
+                if (readPeekBytes(h, &id, 2)) entryCount = id;
                 entryLength = 3;
             }
         }
@@ -734,12 +778,19 @@ int32_t TOVA_CALL rcfLrecWrite(FileHandle h, int32_t type, uint32_t count, const
     }
     if (data == nullptr) return RCF_FAIL(h, F_ERR_ARGUMENT);
     if (!beginWrite(h)) return h->error;
-    unsigned char header[5];
-    header[0] = static_cast<unsigned char>(static_cast<int8_t>(type));
+    unsigned char record[5 + kSmallRecordBytes];
+    record[0] = static_cast<unsigned char>(static_cast<int8_t>(type));
     const uint32_t diskCount = h->swapBytes != 0 ? bswap(count) : count;
-    std::memcpy(header + 1, &diskCount, 4);
-    putBytes(h, header, sizeof(header));
-    putElements(h, data, rcfSimpSize(type), count);
+    std::memcpy(record + 1, &diskCount, 4);
+    const uint64_t bytes = recordBytes64(type, count);
+    if (h->swapBytes == 0 && bytes <= kSmallRecordBytes) {
+        // A small record goes to the stream in one call, header and elements.
+        std::memcpy(record + 5, data, static_cast<size_t>(bytes));
+        putBytes(h, record, static_cast<size_t>(5 + bytes));
+    } else {
+        putBytes(h, record, 5);
+        putElements(h, data, rcfSimpSize(type), count);
+    }
     h->lastOp = -1;
     return h->error;
 }
@@ -768,11 +819,15 @@ uint32_t TOVA_CALL rcfLrecRead(FileHandle h, int32_t type, uint32_t maxCount, vo
             RCF_FAIL(h, F_ERR_ARGUMENT);
             return 0;
         }
-        if (!fitsInFile(h, bytes)) {
+        // A small record is read without asking for the file's length: one
+        // cut short meets the end of the file, a read failure all the same.
+        if (bytes > kSmallRecordBytes && !fitsInFile(h, bytes)) {
             RCF_FAIL(h, F_ERR_READ);
             return 0;
         }
-        return rcfReadRaw(buffer, rcfSimpSize(t), count, h, 0) ? count : 0;
+        if (rcfReadRaw(buffer, rcfSimpSize(t), count, h, 0)) return count;
+        if (h->error == F_EOF) RCF_FAIL(h, F_ERR_READ);
+        return 0;
     }
     if (t < 0) {
         rcfUnpeekHeader(h);

@@ -47,6 +47,12 @@ struct RcfFile {
     // seen so far, refreshed on demand to bound what a record may claim.
     std::unique_ptr<char[]> ioBuffer;
     int64_t knownSize = 0;
+    // For the gridded-data layer: the offset just after the block that starts
+    // the dynamic data, once it has been written or found (-1 before), and
+    // the measured byte length of one time step (0 before). The start never
+    // moves while the file is open, so positioning can go there at once.
+    int64_t dynamicStart = -1;
+    int64_t timeStepLength = 0;
 
     RcfFile() = default;
     RcfFile(const RcfFile&) = delete;

@@ -72,7 +72,7 @@ TEST(ToolCheck, SoundFilesPassWithTheirCounts) {
     const std::string xfs = dir.file("a.xfs");
     tooltest::writeXsecFile(xfs);
     tooltest::writeVreFile(vre);
-    tooltest::writeGridFile(grd, 0);
+    tooltest::writeGridFile(grd);
     writeRawFile(raw, concat({record(1, 3, 4), blockStart(7), record(2, 1, 8), {0xFF}, blockStart(8), {0xFF}}));
 
     for (const std::string& path : {vre, grd, raw, xfs}) {
@@ -318,7 +318,7 @@ TEST(ToolCheck, TruncatedAndBitFlippedVreFilesFailWithoutCrashing) {
 
 TEST(ToolCheck, TruncatedAndBitFlippedGridFilesFailWithoutCrashing) {
     testutil::TempDir dir;
-    tooltest::writeGridFile(dir.file("a.grd"), 0);
+    tooltest::writeGridFile(dir.file("a.grd"));
     checkDamagedCopies(dir.file("a.grd"), true, true);
 }
 

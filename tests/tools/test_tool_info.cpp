@@ -6,22 +6,16 @@
 #include <nlohmann/json.hpp>
 
 #include <algorithm>
-#include <regex>
 
 #include "rcf/rcf_internal.h"
 #include "tool_test.h"
 #include "tova/vre.h"
 #include "tova/xfs.h"
 
+using tooltest::masked;
 using tooltest::runTova;
 
 namespace {
-
-std::string masked(std::string text, const std::string& path) {
-    text = std::regex_replace(text, std::regex(R"(\d{4}-\d\d-\d\d \d\d:\d\d:\d\d)"), "YYYY-MM-DD hh:mm:ss");
-    for (size_t at; (at = text.find(path)) != std::string::npos;) text.replace(at, path.size(), "FILE");
-    return text;
-}
 
 nlohmann::json infoJson(const std::string& path) {
     const tooltest::Run run = runTova({"info", "--json", path});

@@ -10,6 +10,7 @@
 
 #include <fstream>
 #include <memory>
+#include <regex>
 #include <stdexcept>
 
 #include "rcf/rcf_internal.h"
@@ -94,6 +95,12 @@ Run runTova(const std::vector<std::string>& args) {
     run.out = slurp(outPath);
     run.err = slurp(errPath);
     return run;
+}
+
+std::string masked(std::string text, const std::string& path) {
+    text = std::regex_replace(text, std::regex(R"(\d{4}-\d\d-\d\d \d\d:\d\d:\d\d)"), "YYYY-MM-DD hh:mm:ss");
+    for (size_t at; (at = text.find(path)) != std::string::npos;) text.replace(at, path.size(), "FILE");
+    return text;
 }
 
 Layout walkLayout(const std::string& path) {

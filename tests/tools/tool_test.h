@@ -24,6 +24,10 @@ struct Run {
 // Runs the tool with args; sanitizer reports get exit codes of their own.
 Run runTova(const std::vector<std::string>& args);
 
+// Output with the stamps ("YYYY-MM-DD hh:mm:ss") and every occurrence of
+// path ("FILE") masked, for golden texts.
+std::string masked(std::string text, const std::string& path);
+
 // Offsets of the structure of a sound record file, from a walk through the
 // public API: the byte ranges of every record header, block start and
 // terminator, and the offsets at which a top-level record or block ends (a

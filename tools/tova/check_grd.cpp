@@ -150,7 +150,7 @@ public:
                                     " time steps, the file ends before its dynamic section (block 50000)"};
         }
         if (stepsSeen_ > headerSteps_) {
-            notes_.push_back("the header says " + std::to_string(headerSteps_) + " time steps, the data holds " +
+            warnings_.push_back("the header says " + std::to_string(headerSteps_) + " time steps, the data holds " +
                              std::to_string(stepsSeen_) +
                              " complete ones: the header was not brought up to date after the last steps were "
                              "written (the file can be repaired; readers see only " +

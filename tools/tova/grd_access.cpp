@@ -3,6 +3,7 @@
 // calendar dates for the times of time steps.
 #include "grd_access.h"
 
+#include <algorithm>
 #include <charconv>
 #include <cmath>
 #include <cstdio>
@@ -10,7 +11,6 @@
 
 #include "qty/qty.h"
 #include "tova/rcf.h"
-#include "tova_cli.h"
 
 namespace tova_cli {
 
@@ -40,6 +40,31 @@ void GridFile::close() noexcept {
         if (header_ == nullptr || grdFileClose(header_, &file_) != F_NO_ERROR) rcfFileClose(&file_);
     }
     if (header_ != nullptr) grdHeaderDestroy(&header_);
+}
+
+RecordFileInfo probeGridFile(const std::string& path) {
+    RecordFileInfo file = probeRecordFile(path);
+    if (file.kind != FileKind::Grid) {
+        throw Failure(path + " is no gridded data file (it is a " + kindDescription(file.kind) + ")");
+    }
+    return file;
+}
+
+void checkItemNumber(HeaderHandle header, std::optional<int32_t> item, const std::string& path) {
+    const int32_t items = grdGetNoOfItems(header);
+    if (item && (*item < 1 || *item > items)) {
+        throw Failure(path + " has no item " + std::to_string(*item) + " (items 1 to " + std::to_string(items) + ")");
+    }
+}
+
+size_t valueBytes(int64_t elements, int32_t type, uint64_t fileSize, const std::string& what) {
+    const size_t size = elementSize(type);
+    if (size == 0) throw Failure(what + " has data type " + std::to_string(type) + ", no simple type");
+    const uint64_t bytes = static_cast<uint64_t>(std::max<int64_t>(elements, 0)) * size;
+    if (elements > (int64_t{1} << 40) || bytes > std::max<uint64_t>(64 * fileSize, uint64_t{1} << 30)) {
+        throw Failure(what + " claims " + std::to_string(elements) + " values, far more than the file can hold");
+    }
+    return static_cast<size_t>(bytes);
 }
 
 StaticPtr readStatic(FileHandle file, int32_t* status) {
@@ -250,10 +275,16 @@ TimeAxis timeAxis(HeaderHandle header) {
     return axis;
 }
 
-std::string TimeAxis::text(double rel) const {
+std::string TimeAxis::value(double rel) const {
     if (calendar && unitSeconds > 0) return advanceDate(startDate, startTime, (start + rel) * unitSeconds);
-    const std::string value = calendar ? "+" + formatDouble(start + rel) : formatDouble(start + rel);
-    return unitText.empty() ? value : value + " " + unitText;
+    // A calendar whose unit is no time unit: the start and the offset.
+    if (calendar) return startDate + " " + startTime + " +" + formatDouble(start + rel);
+    return formatDouble(start + rel);
+}
+
+std::string TimeAxis::text(double rel) const {
+    const std::string v = value(rel);
+    return unitText.empty() || (calendar && unitSeconds > 0) ? v : v + " " + unitText;
 }
 
 double TimeAxis::lastOffset() const {

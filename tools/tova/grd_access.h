@@ -7,11 +7,13 @@
 
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 #include <type_traits>
 
 #include "json.h"
 #include "tova/grd.h"
+#include "tova_cli.h"
 
 namespace tova_cli {
 
@@ -41,6 +43,15 @@ struct StaticFree {
     void operator()(ItemHandle item) const { grdStaticDestroy(&item); }
 };
 using StaticPtr = std::unique_ptr<std::remove_pointer_t<ItemHandle>, StaticFree>;
+
+// The record-file header of path; Failure unless it is a gridded data file.
+RecordFileInfo probeGridFile(const std::string& path);
+// Failure when item is given and is none of the header's items.
+void checkItemNumber(HeaderHandle header, std::optional<int32_t> item, const std::string& path);
+// Bytes of the value array of an item (elements of a simple type); Failure
+// with what as the subject when no file of fileSize bytes could fill it (a
+// compressed item is read into its whole grid, so up to 64 times the file).
+size_t valueBytes(int64_t elements, int32_t type, uint64_t fileSize, const std::string& what);
 
 // The next static item of the file, or null at the end of the static section
 // (*status 0) or on failure.
@@ -107,7 +118,8 @@ struct TimeAxis {
     double unitSeconds = 0;  // seconds per unit, 0 when the unit is no time unit
 
     // The time rel units after the start: a date and time for calendar
-    // axes, a number for time axes.
+    // axes, a number for time axes (text: with its unit).
+    std::string value(double rel) const;
     std::string text(double rel) const;
     // Time of step t of an equidistant axis, relative to the start.
     double stepOffset(int64_t t) const { return static_cast<double>(t) * step; }

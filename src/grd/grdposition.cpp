@@ -10,6 +10,7 @@
 #include "grd/fileio.h"
 #include "grd/grddynamic.h"
 #include "grd/grdio.h"
+#include "grd/grdplugin.h"
 #include "grd/grdstream.h"
 
 namespace {
@@ -117,7 +118,8 @@ bool timeStepStartsHere(GrdHeader* header, FileHandle file) {
 // steps differ in length.
 int32_t walkToTimeStep(GrdHeader* header, FileHandle file, int32_t t) {
     int32_t status = grdFindBlockDynamic(header, file);
-    const int64_t records = static_cast<int64_t>(header->noOfItems) *
+    // The file's own items, also while a plug-in offers others.
+    const int64_t records = static_cast<int64_t>(grdFileItemCount(header)) *
         (header->fileType == F_EQTIME_TVARSPACE_ALLITEMS || header->fileType == F_NEQTIME_TVARSPACE_VARITEMS ? 2 : 1);
     for (int32_t step = 0; step < t && status == F_NO_ERROR; ++step) {
         LrecNode* list = nullptr;

@@ -462,6 +462,36 @@ TOVA_API int32_t TOVA_CALL grdGetItemStats(HeaderHandle header, int32_t itemNo, 
 TOVA_API int32_t TOVA_CALL grdGetItemStatsGlobal(ItemHandle item, double* minimum, double* maximum,
                                                  int32_t* deletes);
 
+/* ---- Extension plug-ins ------------------------------------------------------
+ * A file opened with grdFileRead can be given the extension library that its
+ * data type selects: "grdExt_<n>" with the platform's suffix (.so, .dylib,
+ * .dll), n the absolute value of the data type, found by the platform
+ * loader's standard search only (never in the data file's folder). It is
+ * loaded only by grdEnablePlugin. The plug-in replaces the header's items by
+ * its own list (copies of the file's items and items it derives); from then
+ * on every dynamic read and skip goes through it. Writing a plug-in:
+ * grdext.h. */
+
+/* Loads the plug-in of the header's data type for file. Returns 0, or the
+ * non-zero status that the plug-in's last description call returned (the
+ * plug-in is loaded in both cases); -1 when refused: the file is not open for
+ * reading only, a plug-in is already loaded, the cursor stands inside a time
+ * step, a required entry point is missing, its initialisation fails or an
+ * axis it describes is out of range (the header is left unchanged); -2 when the data type is 0; -3 when the
+ * library cannot be loaded. -1, -2 and -3 are returned, never reported.
+ * Item handles taken before a successful call are no longer valid. */
+TOVA_API int32_t TOVA_CALL grdEnablePlugin(HeaderHandle header, FileHandle file);
+/* Calls the plug-in's grdExtTerminate (its result is returned; 0 without
+ * one) and unloads the library. The plug-in's items stay in the header; they
+ * describe the plug-in, not the file, which is read again by reopening it.
+ * 0 when no plug-in is loaded. The header's destruction unloads a plug-in
+ * the same way. */
+TOVA_API int32_t TOVA_CALL grdUnloadPlugin(HeaderHandle header);
+/* The dynamic-data cursor: the item (1-based) that the next read, write or
+ * skip concerns, and the number of time steps done. Lets a plug-in tell
+ * which item grdExtReadItemTimeStep is asked for. */
+TOVA_API int32_t TOVA_CALL grdGetItemCursor(HeaderHandle header, int32_t* nextItemNo, int32_t* timeStepsDone);
+
 TOVA_EXTERN_C_END
 
 #endif /* TOVA_GRD_H */

@@ -1,24 +1,55 @@
 """tova: the gridded data, cross-section and VRE files of the modelling
 suite, and its units, from Python.
 
-Submodules: ``units`` (quantities, units, conversions), ``vre`` (VRE files),
-``xsec`` (cross-section files), ``errors`` (status codes and ``TovaError``). The C libraries are found as
-``tova._lib`` describes and loaded on first use.
+Gridded data files: ``tova.open(path)`` reads one (``GridFile``),
+``tova.create(path, items, time_axis)`` writes one (``GridWriter``);
+``tova.plot_item`` draws an item at a time step. With xarray installed,
+``xarray.open_dataset(path, engine="tova")`` opens one lazily
+(``tova.xarray_backend``).
+
+Submodules: ``grd`` (gridded data files), ``units`` (quantities, units,
+conversions), ``vre`` (VRE files), ``xsec`` (cross-section files), ``errors``
+(status codes and ``TovaError``). The C libraries are found as ``tova._lib``
+describes and loaded on first use.
 """
 
-from . import errors, units, vre, xsec
+from . import errors, grd, units, vre, xsec
 from ._lib import ENV_VAR, LibraryNotFoundError, library_paths
 from .errors import TovaError, UnitError
+from .grd import (Axis, CustomBlock, DeleteValues, GridFile, GridWriter, Item, Projection, StaticItem, TimeAxis,
+                  create, open)
 
 __version__ = "0.1.0"
 
+
+def plot_item(path, item, step=-1, **options):
+    """Draws a 2-D item of a gridded data file at one time step with
+    matplotlib; see ``tova.plot.plot_item``."""
+    from .plot import plot_item as plot
+
+    return plot(path, item, step, **options)
+
+
 __all__ = [
+    "Axis",
+    "CustomBlock",
+    "DeleteValues",
     "ENV_VAR",
+    "GridFile",
+    "GridWriter",
+    "Item",
     "LibraryNotFoundError",
+    "Projection",
+    "StaticItem",
+    "TimeAxis",
     "TovaError",
     "UnitError",
+    "create",
     "errors",
+    "grd",
     "library_paths",
+    "open",
+    "plot_item",
     "units",
     "vre",
     "xsec",

@@ -29,6 +29,7 @@ import sys
 import threading
 from ctypes import (
     POINTER,
+    c_byte,
     c_char,
     c_char_p,
     c_double,
@@ -264,6 +265,100 @@ TOVA_PROTOTYPES.update({
     "xfsXsecFind": (XsecHandle, [c_void_p, c_char_p, c_double, c_char_p, p_handle]),
     "xfsXsecFindNext": (XsecHandle, [c_void_p, c_void_p]),
 })
+
+# Gridded data files. Handles are opaque pointers; texts handed out are lent.
+p_coords = POINTER(POINTER(c_double))
+_H = c_void_p  # HeaderHandle, FileHandle, ItemHandle, CustomBlockHandle
+TOVA_PROTOTYPES.update({
+    "grdHeaderCreate": (i32, [i32, c_char_p, c_char_p, i32, i32, i32, p_handle]),
+    "grdHeaderDestroy": (i32, [p_handle]),
+    "grdFileTypeStr": (c_char_p, [i32]),
+    "grdTimeAxisTypeStr": (c_char_p, [i32]),
+    "grdGetFileType": (i32, [_H]),
+    "grdGetFileTitle": (c_char_p, [_H]),
+    "grdSetFileTitle": (i32, [_H, c_char_p]),
+    "grdGetAppTitle": (c_char_p, [_H]),
+    "grdSetAppTitle": (i32, [_H, c_char_p]),
+    "grdGetAppVersionNo": (i32, [_H]),
+    "grdGetDataType": (i32, [_H]),
+    "grdSetDataType": (i32, [_H, i32]),
+    "grdGetItemStatsType": (i32, [_H]),
+    "grdGetDeleteValFloat": (c_float, [_H]),
+    "grdGetDeleteValDouble": (c_double, [_H]),
+    "grdGetDeleteValByte": (c_byte, [_H]),
+    "grdGetDeleteValInt": (i32, [_H]),
+    "grdGetDeleteValUnsignedInt": (c_uint32, [_H]),
+    "grdSetDeleteValFloat": (i32, [_H, c_float]),
+    "grdSetDeleteValDouble": (i32, [_H, c_double]),
+    "grdSetDeleteValByte": (i32, [_H, c_byte]),
+    "grdSetDeleteValInt": (i32, [_H, i32]),
+    "grdSetDeleteValUnsignedInt": (i32, [_H, c_uint32]),
+    "grdParamModifyTimes": (i32, [_H, i32]),
+    "grdGetGeoInfoType": (i32, [_H]),
+    "grdSetGeoInfoUTMProj": (i32, [_H, c_char_p, c_double, c_double, c_double]),
+    "grdGetGeoInfoUTMProj": (i32, [_H, p_text, p_double, p_double, p_double]),
+    "grdAddCustomBlock": (i32, [_H, i32, c_char_p, i32, c_void_p]),
+    "grdGetCustomBlockRef": (i32, [_H, p_handle]),
+    "grdGetCustomBlock": (i32, [_H, p_i32, p_text, p_i32, p_handle, p_handle]),
+    "grdGetNoOfItems": (i32, [_H]),
+    "grdItemD": (_H, [_H, i32]),
+    "grdSetItemInfo": (i32, [_H, _H, i32, c_char_p, i32, i32]),
+    "grdGetItemInfo": (i32, [_H, p_i32, p_text, p_text, p_i32, p_text, p_i32]),
+    "grdSetItemValueType": (i32, [_H, i32]),
+    "grdGetItemValueType": (i32, [_H, p_i32]),
+    "grdGetItemAxisType": (i32, [_H]),
+    "grdGetEncodeKeySize": (i32, [_H]),
+    "grdSetEncodeKey": (i32, [_H, p_i32, p_i32, p_i32, i32]),
+    "grdIsFileCompressed": (i32, [_H]),
+    "grdGetItemStatsGlobal": (i32, [_H, p_double, p_double, p_i32]),
+    # Time axes.
+    "grdSetEqTimeAxis": (i32, [_H, i32, c_double, c_double, i32]),
+    "grdSetNeqTimeAxis": (i32, [_H, i32, c_double, i32]),
+    "grdSetEqCalendarAxis": (i32, [_H, c_char_p, c_char_p, i32, c_double, c_double, i32]),
+    "grdSetNeqCalendarAxis": (i32, [_H, c_char_p, c_char_p, i32, c_double, i32]),
+    "grdGetTimeAxisType": (i32, [_H]),
+    "grdGetEqTimeAxis": (i32, [_H, p_i32, p_text, p_double, p_double, p_i32, p_i32]),
+    "grdGetNeqTimeAxis": (i32, [_H, p_i32, p_text, p_double, p_double, p_i32, p_i32]),
+    "grdGetEqCalendarAxis": (i32, [_H, p_i32, p_text, p_text, p_text, p_double, p_double, p_i32, p_i32]),
+    "grdGetNeqCalendarAxis": (i32, [_H, p_i32, p_text, p_text, p_text, p_double, p_double, p_i32, p_i32]),
+    # File lifecycle, static items, dynamic data, positioning.
+    "grdFileCreate": (i32, [c_char_p, _H, p_handle]),
+    "grdFileRead": (i32, [c_char_p, p_handle, p_handle]),
+    "grdFileFlush": (i32, [_H, _H]),
+    "grdFileClose": (i32, [_H, p_handle]),
+    "grdStaticCreate": (i32, [p_handle]),
+    "grdStaticDestroy": (i32, [p_handle]),
+    "grdStaticSetHeader": (i32, [_H, _H]),
+    "grdStaticWrite": (i32, [_H, _H, c_void_p]),
+    "grdStaticRead": (_H, [_H, p_i32]),
+    "grdStaticGetData": (i32, [_H, c_void_p]),
+    "grdWriteItemTimeStep": (i32, [_H, _H, c_double, c_void_p]),
+    "grdReadItemTimeStep": (i32, [_H, _H, p_double, c_void_p]),
+    "grdFindBlockStatic": (i32, [_H, _H]),
+    "grdFindTimeStep": (i32, [_H, _H, i32]),
+    "grdFindItemDynamic": (i32, [_H, _H, i32, i32]),
+    "rcfFileClose": (i32, [p_handle]),
+})
+
+
+def _axis_prototypes() -> dict:
+    """Setters and getters of the item axes: (unit, sizes, then origins and
+    steps, coordinate arrays or nothing), by kind and dimension."""
+    protos = {"grdSetItemAxisEqD0": (i32, [_H, i32]), "grdGetItemAxisEqD0": (i32, [_H, p_i32, p_text])}
+    for d in (1, 2, 3, 4):
+        protos[f"grdSetItemAxisEqD{d}"] = (i32, [_H, i32] + [i32] * d + [c_float] * (2 * d))
+        protos[f"grdGetItemAxisEqD{d}"] = (i32, [_H, p_i32, p_text] + [p_i32] * d + [p_float] * (2 * d))
+    for kind, dims in (("Neq", (1, 2, 3)), ("CurveLinear", (2, 3))):
+        for d in dims:
+            protos[f"grdSetItemAxis{kind}D{d}"] = (i32, [_H, i32] + [i32] * d + [p_double] * d + [i32])
+            protos[f"grdGetItemAxis{kind}D{d}"] = (i32, [_H, p_i32, p_text] + [p_i32] * d + [p_coords] * d)
+    for d in (1, 2, 3):
+        protos[f"grdSetItemAxisTvarD{d}"] = (i32, [_H, i32] + [i32] * d)
+        protos[f"grdGetItemAxisTvarD{d}"] = (i32, [_H, p_i32, p_text] + [p_i32] * d)
+    return protos
+
+
+TOVA_PROTOTYPES.update(_axis_prototypes())
 
 
 def _missing(lib_name: str, name: str):

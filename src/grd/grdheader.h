@@ -177,6 +177,14 @@ int32_t grdItemInitStatistics(GrdHeader* header, GrdItem* item, const char* modu
 int64_t grdItemFullElements(const GrdItem* item) noexcept;   // the XYZ size
 int64_t grdItemElementCount(const GrdItem* item) noexcept;   // grdGetItemElements
 int64_t grdItemUsedElementCount(const GrdItem* item) noexcept;  // grdGetUsedItemElements
+// Values held by coordinate array d (0-2) of the item's axis: size + 1
+// boundaries (non-equidistant), one per node (curvilinear), else 0.
+int64_t grdItemCoordinateCount(const GrdItem* item, int32_t d) noexcept;
+// Makes to a deep copy of from (texts, coordinate arrays, points read from
+// the file, element statistics, associations); false when memory fails (to
+// is then partly filled and still destroyable). Copies every field above:
+// keep it in step when a field is added.
+bool grdItemCopy(GrdItem* to, const GrdItem* from) noexcept;
 // Element width of simple types 1-7, else 0.
 int32_t grdSimpleTypeSize(int32_t simpleType) noexcept;
 // Quantity type of an axis kind (100185-100188, else 999).

@@ -887,3 +887,7 @@ int32_t TOVA_CALL grdGetItemAxisTvarD3(ItemHandle item, int32_t* unit, const cha
 }
 
 }  // extern "C"
+
+int64_t grdItemCoordinateCount(const GrdItem* item, int32_t d) noexcept {
+    return d >= 0 && d < 3 && d < axisDirections(item->axisType) ? coordinateCount(item->axisType, item->size, d) : 0;
+}

@@ -10,6 +10,7 @@
 #include "grd/fileio.h"
 #include "grd/grddynamic.h"
 #include "grd/grdio.h"
+#include "grd/grdplugin.h"
 #include "grd/grdstream.h"
 
 namespace {
@@ -117,7 +118,8 @@ bool timeStepStartsHere(GrdHeader* header, FileHandle file) {
 // steps differ in length.
 int32_t walkToTimeStep(GrdHeader* header, FileHandle file, int32_t t) {
     int32_t status = grdFindBlockDynamic(header, file);
-    const int64_t records = static_cast<int64_t>(header->noOfItems) *
+    // The file's own items, also while a plug-in offers others.
+    const int64_t records = static_cast<int64_t>(grdFileItemCount(header)) *
         (header->fileType == F_EQTIME_TVARSPACE_ALLITEMS || header->fileType == F_NEQTIME_TVARSPACE_VARITEMS ? 2 : 1);
     for (int32_t step = 0; step < t && status == F_NO_ERROR; ++step) {
         LrecNode* list = nullptr;
@@ -202,10 +204,9 @@ int32_t gotoTimeStep(GrdHeader* header, FileHandle file, int32_t t) {
     return forwardToTimeStep(header, file, t);
 }
 
-// Passes over the next static item without reading its values: the blocks
-// of its item record up to and including the 40001 block with its values.
-// *found is false when no static item follows (the static part is over).
-int32_t skipStaticItem(GrdHeader* header, FileHandle file, bool* found) {
+// Whether a static item follows (passing the block that starts the static
+// section first, as the static reader does); the position stays before it.
+int32_t staticItemFollows(GrdHeader* header, FileHandle file, bool* found) {
     *found = false;
     if (file->ownerMark > kSectionStatic) return F_NO_ERROR;
     uint32_t identifier = 0;
@@ -214,10 +215,20 @@ int32_t skipStaticItem(GrdHeader* header, FileHandle file, bool* found) {
         rcfBlockSkip(file);
         file->ownerMark = kSectionStatic;
     }
-    if (rcfQuery(file, &identifier) != RCF_BLOCK || (identifier != kTagItemText && identifier != kTagItem)) {
-        const int32_t error = takeError(header, file, __LINE__);
-        return error > F_EOF ? error : F_NO_ERROR;
-    }
+    *found = rcfQuery(file, &identifier) == RCF_BLOCK && (identifier == kTagItemText || identifier == kTagItem);
+    if (*found) return F_NO_ERROR;
+    const int32_t error = takeError(header, file, __LINE__);
+    return error > F_EOF ? error : F_NO_ERROR;
+}
+
+// Passes over the next static item without reading its values: the blocks
+// of its item record up to and including the 40001 block with its values.
+// *found is false when no static item follows (the static part is over).
+int32_t skipStaticItem(GrdHeader* header, FileHandle file, bool* found) {
+    const int32_t status = staticItemFollows(header, file, found);
+    if (status != F_NO_ERROR || !*found) return status;
+    *found = false;
+    uint32_t identifier = 0;
     while (file->error == F_NO_ERROR) {
         if (rcfQuery(file, &identifier) != RCF_BLOCK || identifier == kTagStaticStart ||
             identifier == kTagDynamicStart) {
@@ -284,12 +295,13 @@ int32_t TOVA_CALL grdFindItemStatic(HeaderHandle header, FileHandle file, int32_
         if (status != F_NO_ERROR) return status;
         if (staticItemNo < 1) return F_ERR_ITEM_RANGE;
         status = grdFindBlockStatic(header, file);
-        for (int32_t k = 1; k < staticItemNo && status == F_NO_ERROR; ++k) {
-            bool found = false;
+        if (status != F_NO_ERROR) return status;
+        // Passes over the items before it; it must be there itself.
+        bool found = true;
+        for (int32_t k = 1; k < staticItemNo && status == F_NO_ERROR && found; ++k)
             status = skipStaticItem(header, file, &found);
-            if (status != F_NO_ERROR || !found) return F_ERR_ITEM_RANGE;
-        }
-        return status;
+        if (status == F_NO_ERROR && found) status = staticItemFollows(header, file, &found);
+        return status != F_NO_ERROR || !found ? F_ERR_ITEM_RANGE : F_NO_ERROR;
     }));
 }
 

@@ -15,6 +15,7 @@
 #include "grd/fileio.h"
 #include "grd/grddynamic.h"
 #include "grd/grdio.h"
+#include "grd/grdplugin.h"
 #include "grd/grdstream.h"
 #include "qty/qty.h"
 
@@ -331,6 +332,14 @@ int32_t readItem(GrdHeader* header, FileHandle file, double* time, void* data) {
     Cursor c;
     int32_t status = prepareDynamicAccess(header, file, kMaskReadWrite, c, __LINE__);
     if (status != F_NO_ERROR) return status;
+    if (grdPluginRoutes(header)) {
+        // A loaded plug-in delivers the item (reading the file itself).
+        status = grdPluginDeliver(header, file, data, true);
+        if (status == F_NO_ERROR) grdConvertItemData(header, c.item, data, c.elements, false);
+        if (time != nullptr) *time = header->currentTime;
+        if (status == F_NO_ERROR) advanceCursor(header);
+        return status;
+    }
     int64_t stepStart = -1;
     if (header->nextItem == 0) {
         stepStart = rcfTell64(file);
@@ -352,10 +361,13 @@ int32_t skipItem(GrdHeader* header, FileHandle file) {
     Cursor c;
     int32_t status = prepareDynamicAccess(header, file, kMaskSkipItem, c, __LINE__);
     if (status != F_NO_ERROR) return status;
-    // Seam for extension plug-ins (header->extension.data): when a plug-in
-    // supplies derived items, a skip at item 0 lets it prepare the new time
-    // step, and its items are passed without touching the file. The plug-in
-    // loader hooks in here; without one every item is in the file.
+    // A loaded plug-in prepares each new time step (reading the file
+    // itself); its items are passed without touching the file.
+    if (grdPluginRoutes(header)) {
+        status = grdPluginDeliver(header, file, nullptr, false);
+        if (status == F_NO_ERROR) advanceCursor(header);
+        return status;
+    }
     if (header->nextItem == 0) {
         status = readTimeStepBlock(header, file);
         if (status != F_NO_ERROR) return status;

@@ -223,11 +223,15 @@ void seekTo(RcfFile* h, int64_t offset, int32_t origin) {
 
 // Short forward skips after a read go through the scratch buffer, keeping
 // the stream's own buffer; anything else is a relative seek.
+bool skipsByReading(const RcfFile* h, int64_t n) {
+    return h->lastOp >= 0 && n >= 1 && n < static_cast<int64_t>(sizeof(h->scratch));
+}
+
 void skipBytes(RcfFile* h, int64_t n) {
     if (h->error == F_EOF) h->error = 0;
     if (h->error != 0) return;
     resetPeek(h);
-    if (h->lastOp >= 0 && n >= 1 && n < static_cast<int64_t>(sizeof(h->scratch))) {
+    if (skipsByReading(h, n)) {
         const auto want = static_cast<size_t>(n);
         if (streamRead(h->scratch, want, h->stream) < want) RCF_FAIL(h, F_ERR_SEEK);
         h->lastOp = 1;
@@ -903,6 +907,19 @@ int32_t TOVA_CALL rcfSkip(FileHandle h) {
     int64_t n = 0;
     if (t >= 1) {
         n = static_cast<int64_t>(recordBytes64(t, count)) + 5;
+        // A skip by seeking is checked against the file's length first: over
+        // a record that runs past the end it would leave the stream far
+        // beyond the end, where a write makes a file of the size a damaged
+        // count claims. The skip stops at the end instead and fails, as a
+        // short skip (which reads) does.
+        if (!skipsByReading(h, n - unconsumed(h)) && !fitsInFile(h, static_cast<uint64_t>(n))) {
+            h->pendingSkip = 0;
+            resetPeek(h);
+            streamSeek(h->stream, 0, SEEK_END);
+            h->lastOp = 0;
+            RCF_FAIL(h, F_ERR_SEEK);
+            return t;
+        }
     } else if (t == RCF_BLOCK) {
         n = 3;
     } else if (t < 0) {

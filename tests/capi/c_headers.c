@@ -5,6 +5,7 @@
 
 #include "qty/qty.h"
 #include "tova/grd.h"
+#include "tova/grdext.h"
 #include "tova/rcf.h"
 #include "tova/status.h"
 #include "tova/trace.h"
@@ -45,6 +46,13 @@ int main(void) {
         x->rawMark[1][2] = 7;
         xfsXsecFree(&x);
         if (x != NULL) return 17;
+    }
+    {
+        /* The plug-in interface: entry-point types and names. */
+        grdExtReadItemTimeStepFn read = NULL;
+        int32_t next = 0;
+        if (read != NULL || strcmp(GRD_EXT_READ_ITEM_TIME_STEP, "grdExtReadItemTimeStep") != 0) return 18;
+        if (grdGetItemCursor(NULL, &next, NULL) != 1000 || grdEnablePlugin(NULL, NULL) != 1000) return 19;
     }
     puts("C API ok");
     return 0;

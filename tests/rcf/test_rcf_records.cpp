@@ -350,6 +350,56 @@ TEST(RcfLimits, CountsBeyondTheFileAreRefusedBeforeAllocating) {
 #endif
 }
 
+// Found by fuzz_rcf (fuzz/regressions/fuzz_rcf/skip-past-end-then-write): a
+// skip over a record whose count claims more than the file holds sought far
+// beyond the end, and the next write in an edited file made it gigabytes long.
+TEST(RcfLimits, ASkipStopsAtTheEndOfTheFile) {
+    TempDir dir;
+    const std::string path = dir.file("skip.rcf");
+    {
+        File f;
+        ASSERT_EQ(rcfFileOpenCreate(path.c_str(), "", f.out(), testApp, 1), 0);
+    }
+    std::string b;
+    {
+        const auto header = readBytes(path);
+        b.assign(header.begin(), header.end());
+    }
+    const size_t appBase = b.size();
+    // A double record claiming 2^28 elements (2 GiB), 16 bytes present; then
+    // the same record inside a block.
+    b += '\x02';
+    putBE(b, 0x00000010u, 4);  // little-endian 0x10000000
+    b.append(16, '\x11');
+    const size_t block = b.size();
+    b += std::string("\xFE\x05\x00\x02", 4);
+    putBE(b, 0x00000010u, 4);
+    b.append(16, '\x22');
+    writeBytes(path, toBytes(b));
+    const int64_t length = static_cast<int64_t>(b.size());
+
+    {
+        File f;
+        ASSERT_EQ(rcfFileOpenEdit(path.c_str(), f.out(), testApp, nullptr), 0);
+        EXPECT_EQ(rcfSkip(f), RCF_DOUBLE);
+        EXPECT_EQ(rcfGetError(f), F_ERR_SEEK);
+        EXPECT_EQ(rcfTell64(f), length);
+        const int32_t v = 5;
+        EXPECT_EQ(rcfLrecWrite(f, RCF_INT4, 1, &v), 0);  // lands at the end
+        rcfSeek64(f, static_cast<uint32_t>(block), 0, 0);
+        EXPECT_EQ(rcfBlockSkip(f), F_ERR_SEEK);
+    }
+    EXPECT_EQ(readBytes(path).size(), b.size() + 9);
+
+    File f;
+    ASSERT_EQ(rcfFileOpenRead(path.c_str(), f.out(), testApp, nullptr), 0);
+    rcfSeek64(f, static_cast<uint32_t>(appBase), 0, 0);
+    EXPECT_EQ(rcfSkip(f), RCF_DOUBLE);
+    EXPECT_EQ(rcfGetError(f), F_ERR_SEEK);
+    EXPECT_EQ(rcfQuery(f, nullptr), 0);  // at the end: nothing more
+    EXPECT_EQ(rcfGetError(f), F_EOF);
+}
+
 TEST(RcfLimits, AFailedWriteIsReportedAs2002) {
     TempDir dir;
     const std::string path = dir.file("w.rcf");

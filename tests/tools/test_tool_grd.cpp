@@ -11,6 +11,7 @@
 #include <sstream>
 
 #include "tool_test.h"
+#include "qty/qty.h"
 #include "tova/grd.h"
 
 using tooltest::masked;
@@ -417,4 +418,73 @@ TEST(ToolGrid, DamagedFilesNeverCrashInfoDumpOrStats) {
                                      << run.err;
         }
     }
+}
+
+TEST(ToolGrid, CompressedAndNonEquidistantFiles) {
+    testutil::TempDir dir;
+    const auto ok = [](int32_t status) { ASSERT_EQ(status, 0); };
+    // A compressed 4 x 3 grid whose key holds five cells, two time steps.
+    const std::string packed = dir.file("packed.grd");
+    HeaderHandle h = nullptr;
+    FileHandle f = nullptr;
+    ok(grdHeaderCreate(F_EQTIME_FIXEDSPACE_ALLITEMS, "packed", "tests", 1, 1, F_ITEM_STATS_ELEMENT, &h));
+    ok(grdSetEqTimeAxis(h, QTY_UNIT_SECOND, 100.0, 60.0, 0));
+    const int32_t kx[5] = {0, 1, 3, 2, 0}, ky[5] = {0, 0, 1, 2, 2};
+    ok(grdSetEncodeKey(h, kx, ky, nullptr, 5));
+    ok(grdSetItemInfo(h, grdItemD(h, 1), 40101, "level", 20100, RCF_FLOAT));
+    ok(grdSetItemAxisEqD2(grdItemD(h, 1), 20100, 4, 3, 0.0f, 0.0f, 1.0f, 1.0f));
+    ok(grdFileCreate(packed.c_str(), h, &f));
+    for (int32_t t = 0; t < 2; ++t) {
+        float v[12];
+        for (int32_t e = 0; e < 12; ++e) v[e] = 100.0f * static_cast<float>(t) + static_cast<float>(e);
+        ok(grdWriteItemTimeStep(h, f, 0.0, v));
+    }
+    ok(grdFileClose(h, &f));
+    grdHeaderDestroy(&h);
+
+    EXPECT_EQ(runTova({"check", packed}).exitCode, 0);
+    const nlohmann::json info = nlohmann::json::parse(runTova({"info", packed, "--json"}).out);
+    EXPECT_EQ(info["grd"]["compressed"], true);
+    EXPECT_EQ(info["grd"]["keyLength"], 5);
+    EXPECT_EQ(info["grd"]["items"][0]["stored"], 5);
+    EXPECT_EQ(info["grd"]["staticItems"].size(), 0u);  // the keys are no ordinary static items
+    // Cells outside the key are delete values; the others hold what was written.
+    const auto rows = csvRows(runTova({"dump", packed, "--step", "1", "--format", "csv"}).out);
+    ASSERT_EQ(rows.size(), 13u);
+    for (int32_t e = 0; e < 12; ++e) {
+        bool inKey = false;
+        for (int32_t i = 0; i < 5; ++i) inKey = inKey || ky[i] * 4 + kx[i] == e;
+        EXPECT_EQ(rows[static_cast<size_t>(e) + 1][1], "160");
+        EXPECT_EQ(rows[static_cast<size_t>(e) + 1][7], inKey ? std::to_string(100 + e) : "") << e;
+    }
+    const nlohmann::json stats = nlohmann::json::parse(runTova({"stats", packed, "--json"}).out);
+    EXPECT_EQ(stats["computed"][0]["values"], 10);
+    EXPECT_EQ(stats["computed"][0]["deletes"], 0);
+    EXPECT_EQ(stats["computed"][0]["mean"].get<double>(), 55.2);
+    EXPECT_TRUE(stats["stored"][0]["agrees"].get<bool>());
+
+    // File type 4: each time step stores its time; a calendar across a leap day.
+    const std::string neq = dir.file("neq.grd");
+    ok(grdHeaderCreate(F_NEQTIME_FIXEDSPACE_ALLITEMS, "neq", "tests", 1, 1, F_ITEM_STATS_GLOBAL, &h));
+    ok(grdSetNeqCalendarAxis(h, "2020-02-28", "23:00:00", QTY_UNIT_SECOND, 0.0, 0));
+    ok(grdSetItemInfo(h, grdItemD(h, 1), QTY_ITEM_UNDEFINED, "x", 0, RCF_DOUBLE));
+    ok(grdSetItemAxisEqD0(grdItemD(h, 1), 0));
+    ok(grdFileCreate(neq.c_str(), h, &f));
+    const double times[3] = {500.0, 4100.0, 90500.5};
+    for (int32_t t = 0; t < 3; ++t) {
+        const double v = 1.5 * t;
+        ok(grdWriteItemTimeStep(h, f, times[t], &v));
+    }
+    ok(grdFileClose(h, &f));
+    grdHeaderDestroy(&h);
+
+    EXPECT_EQ(runTova({"check", neq}).exitCode, 0);
+    const nlohmann::json axis = nlohmann::json::parse(runTova({"info", neq, "--json"}).out)["grd"]["timeAxis"];
+    EXPECT_EQ(axis["startTime"], "23:08:20");  // the first time is the start offset
+    EXPECT_EQ(axis["end"], "2020-03-01 00:08:20.500");
+    EXPECT_EQ(runTova({"dump", neq, "--format", "csv"}).out,
+              "step,time,item,element,i,j,k,value\n"
+              "0,2020-02-28 23:08:20,1,0,,,,0\n"
+              "1,2020-02-29 00:08:20,1,0,,,,1.5\n"
+              "2,2020-03-01 00:08:20.500,1,0,,,,3\n");
 }

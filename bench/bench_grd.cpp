@@ -38,7 +38,9 @@ struct Clock {
     }
 };
 
-constexpr size_t kStreamBuffer = 256 * 1024;  // what the library gives its streams
+// What the library gives its streams: for writing and for reading only.
+constexpr size_t kWriteBuffer = 256 * 1024;
+constexpr size_t kReadBuffer = 64 * 1024;
 
 std::string scratchPath(const char* name) {
     const char* dir = std::getenv("TMPDIR");
@@ -59,7 +61,8 @@ void check(bool ok, const char* what) {
 struct RawFile {
     std::FILE* f;
     std::vector<char> buffer;
-    RawFile(const std::string& path, const char* mode) : f(std::fopen(path.c_str(), mode)), buffer(kStreamBuffer) {
+    RawFile(const std::string& path, const char* mode)
+        : f(std::fopen(path.c_str(), mode)), buffer(std::string(mode) == "rb" ? kReadBuffer : kWriteBuffer) {
         check(f != nullptr, "fopen");
         std::setvbuf(f, buffer.data(), _IOFBF, buffer.size());
     }

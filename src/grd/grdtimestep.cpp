@@ -307,6 +307,9 @@ int32_t readValues(GrdHeader* header, FileHandle file, const Cursor& c, void* da
     if (!c.compressed()) {
         status = grdCheckReadLR(header, c.item->dataType, used, data, file, kModule, __LINE__);
     } else {
+        // The packed values need room of their own: only what the file holds.
+        if (!rcfFits(file, 5 + static_cast<uint64_t>(c.used) * c.size))
+            return report(header, file, F_ERR_READ, __LINE__);
         GrdArray<unsigned char> packed = grdAllocArray<unsigned char>(c.used * c.size);
         if (!packed) return report(header, file, F_ERR_MEMORY, __LINE__);
         status = grdCheckReadLR(header, c.item->dataType, used, packed.get(), file, kModule, __LINE__);

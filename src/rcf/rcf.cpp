@@ -360,8 +360,9 @@ bool openStream(RcfFile* h, const char* path, const char* mode) {
     std::string modeBuffer;
     h->stream = std::fopen(path, withCloseOnExec(mode, modeBuffer));
     if (h->stream == nullptr) return false;
-    h->ioBuffer.reset(new (std::nothrow) char[kRcfStreamBufferSize]);
-    if (h->ioBuffer) std::setvbuf(h->stream, h->ioBuffer.get(), _IOFBF, kRcfStreamBufferSize);
+    const size_t size = std::strcmp(mode, "rb") == 0 ? kRcfReadBufferSize : kRcfStreamBufferSize;
+    h->ioBuffer.reset(new (std::nothrow) char[size]);
+    if (h->ioBuffer) std::setvbuf(h->stream, h->ioBuffer.get(), _IOFBF, size);
     return true;
 }
 
@@ -566,6 +567,8 @@ int32_t rcfFileOpenEdit(const char* path, FileHandle* out, rcfAppIdent appIdent,
 }
 
 uint32_t rcfClockMs() { return clockMs(); }
+
+bool rcfFits(FileHandle h, uint64_t bytes) { return h != nullptr && fitsInFile(h, bytes); }
 
 void rcfSeekAppBase(FileHandle h) {
     if (h != nullptr) seekTo(h, h->appBase, 0);

@@ -63,6 +63,10 @@ struct RcfFile {
 
 constexpr uint32_t kRcfVersionCurrent = 104;
 constexpr size_t kRcfStreamBufferSize = 256 * 1024;
+// Files opened for reading only get a smaller buffer: every jump to a far
+// position refills the whole buffer, and readers are the ones that jump
+// (small records still cost one system call per thousands of them).
+constexpr size_t kRcfReadBufferSize = 64 * 1024;
 
 // Handler form of this layer's own table (slots for 1000 and 2000-2019).
 using rcfErrorHandler = int32_t (*)(int32_t code, const char* module, int32_t line);
@@ -85,6 +89,10 @@ int32_t rcfReportError(int32_t code, const char* module, int32_t line);
 // Raw transfers (apply the byte-order rule).
 int32_t rcfReadRaw(void* buffer, uint32_t elementSize, uint32_t count, FileHandle h, int32_t keepPeek);
 void rcfWriteRaw(void* buffer, uint32_t elementSize, uint32_t count, FileHandle h);
+
+// Whether bytes more can be read from the logical position: the check made
+// before anything is allocated for what a file claims to hold.
+bool rcfFits(FileHandle h, uint64_t bytes);
 
 // Record-header look-ahead and positioning.
 int32_t rcfPeekHeader(FileHandle h, uint32_t* count, uint32_t* headerLength);

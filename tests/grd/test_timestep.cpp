@@ -249,6 +249,32 @@ TEST_F(TimeStep, CompressedItemsStoreOnlyTheKeysElements) {
     EXPECT_EQ(takeCodes(), Codes{2010});
 }
 
+TEST_F(TimeStep, ACompressedRecordCutShortIsRefusedBeforeAnythingIsRead) {
+    makeHeader(F_EQTIME_FIXEDSPACE_ALLITEMS, 1, 1);
+    ASSERT_EQ(grdSetEqTimeAxis(header_, 1400, 0.0, 1.0, 0), 0);
+    defineItem(1, RCF_DOUBLE, 10, 10);
+    std::vector<int32_t> xKey(60), yKey(60);
+    for (int32_t k = 0; k < 60; ++k) {
+        xKey[k] = k % 10;
+        yKey[k] = k / 10;
+    }
+    ASSERT_EQ(grdSetEncodeKey(header_, xKey.data(), yKey.data(), nullptr, 60), 0);
+    create();
+    writeSteps(2);
+    closeFile();
+    std::vector<uint8_t> bytes = testutil::readBytes(path());
+    bytes.resize(bytes.size() - 8);
+    testutil::writeBytes(path(), bytes);
+    reopen();
+    std::vector<double> got(100 + 4, 7.0);
+    ASSERT_EQ(grdReadItemTimeStep(rh(), file_, nullptr, got.data()), 0);
+    EXPECT_EQ(got[59], dyntest::doubleValue(0, 1, 59));
+    std::fill(got.begin(), got.end(), 7.0);
+    EXPECT_EQ(grdReadItemTimeStep(rh(), file_, nullptr, got.data()), 2001);
+    for (double v : got) EXPECT_EQ(v, 7.0);
+    EXPECT_EQ(takeCodes(), Codes{2001});
+}
+
 TEST_F(TimeStep, CompressedWriteOfKeyOrderedValuesOnceCompressionIsEnabled) {
     makeHeader(F_NEQTIME_FIXEDSPACE_ALLITEMS, 1, 1);
     ASSERT_EQ(grdSetNeqTimeAxis(header_, 1400, 0.0, 0), 0);

@@ -1,5 +1,5 @@
 // The command line of the tova tool: usage errors, help, version, the unit
-// table and the gridded-data commands that are not there yet.
+// table, and what the gridded-data commands refuse.
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
 
@@ -50,13 +50,33 @@ TEST(ToolUsage, HelpAndVersionExitWithZero) {
     EXPECT_EQ(version.out.rfind("tova ", 0), 0u) << version.out;
 }
 
-TEST(ToolUsage, GriddedCommandsSayTheyAreNotAvailableYet) {
-    for (const auto& args : std::vector<std::vector<std::string>>{
-             {"dump", "f.grd", "--steps", "0:3", "--format", "csv"}, {"stats", "f.grd"}, {"demo"}}) {
+TEST(ToolUsage, GriddedCommandsRefuseWhatTheFileDoesNotHold) {
+    testutil::TempDir dir;
+    const std::string grd = dir.file("a.grd");
+    const std::string vre = dir.file("a.vre");
+    tooltest::writeGridFile(grd);
+    tooltest::writeVreFile(vre);
+    const std::vector<std::pair<std::vector<std::string>, std::string>> cases = {
+        {{"dump", dir.file("missing.grd")}, "cannot open"},
+        {{"stats", dir.file("missing.grd")}, "cannot open"},
+        {{"dump", vre}, "no gridded data file"},
+        {{"stats", vre, "--item", "1"}, "no gridded data file"},
+        {{"dump", grd, "--item", "3"}, "has no item 3 (items 1 to 2)"},
+        {{"stats", grd, "--item", "9"}, "has no item 9"},
+        {{"dump", grd, "--step", "3"}, "holds time steps 0 to 2; time step 3 is not there"},
+        {{"dump", grd, "--steps", "1:7"}, "time step 7 is not there"},
+        {{"dump", grd, "--static", "3"}, "has no static item 3"},
+        {{"demo", dir.file("a.grd/sub/x.grd")}, "demo: creating"},
+    };
+    for (const auto& [args, phrase] : cases) {
         const tooltest::Run run = runTova(args);
-        EXPECT_EQ(run.exitCode, 1) << args[0];
-        EXPECT_NE(run.err.find("not available yet"), std::string::npos) << args[0] << ": " << run.err;
+        EXPECT_EQ(run.exitCode, 1) << args[0] << " " << args[1] << "\n" << run.err;
+        EXPECT_TRUE(run.out.empty()) << run.out;
+        EXPECT_NE(run.err.find(phrase), std::string::npos) << run.err;
     }
+    // A static item has no item number or time steps of its own.
+    EXPECT_EQ(runTova({"dump", grd, "--static", "1", "--item", "1"}).exitCode, 2);
+    EXPECT_EQ(runTova({"dump", grd, "--limit", "-1"}).exitCode, 2);
 }
 
 TEST(ToolUnits, ListsEveryQuantityWithItsUnits) {

@@ -10,10 +10,12 @@
 
 #include <fstream>
 #include <memory>
+#include <regex>
 #include <stdexcept>
 
-#include "grd/fileio.h"
 #include "rcf/rcf_internal.h"
+#include "qty/qty.h"
+#include "tova/grd.h"
 #include "tova/rcf.h"
 #include "tova/vre.h"
 #include "tova/xfs.h"
@@ -95,6 +97,12 @@ Run runTova(const std::vector<std::string>& args) {
     return run;
 }
 
+std::string masked(std::string text, const std::string& path) {
+    text = std::regex_replace(text, std::regex(R"(\d{4}-\d\d-\d\d \d\d:\d\d:\d\d)"), "YYYY-MM-DD hh:mm:ss");
+    for (size_t at; (at = text.find(path)) != std::string::npos;) text.replace(at, path.size(), "FILE");
+    return text;
+}
+
 Layout walkLayout(const std::string& path) {
     FileHandle f = nullptr;
     if (rcfFileOpenRead(path.c_str(), &f, acceptAny, nullptr) != 0) throw std::runtime_error("not a record file");
@@ -170,27 +178,59 @@ void writeXsecFile(const std::string& path) {
     if (xfsFileClose(&f) != 0) throw std::runtime_error("cannot close the file");
 }
 
-void writeGridLikeFile(const std::string& path) {
-    FileHandle f = FOpenFileCreate(path.c_str(), 0);
-    if (f == nullptr) throw std::runtime_error("cannot create the file");
-    const char title[] = "sample";
-    const int32_t counts[2] = {2, 3};
-    const float values[6] = {1, 2, 3, 4, 5, 6};
-    const double time = 3600.0;
-    LrecNode* titleBlock = rcfLrecNodeNew(RCF_BYTE, sizeof(title), title, 1, nullptr);
-    rcfBlockWrite(10000, f, titleBlock);
-    rcfLrecListFree(&titleBlock);
-    LrecNode* sizes = rcfLrecNodeNew(RCF_INT4, 2, counts, 1, nullptr);
-    rcfLrecNodeNew(RCF_DOUBLE, 1, &time, 1, sizes);
-    rcfBlockWrite(30000, f, sizes);
-    rcfLrecListFree(&sizes);
-    rcfBlockWrite(50000, f, nullptr);
-    for (int step = 0; step < 2; ++step) {
-        rcfBlockWrite(50001, f, nullptr);
-        rcfLrecWrite(f, RCF_FLOAT, 6, values);
-        rcfLrecWrite(f, RCF_INT2, 1, &counts[0]);
+double gridValue(int32_t t, int32_t n, int32_t e) {
+    if (n == 1) return e == 0 || e == 5 ? static_cast<double>(F_DELETE_VALUE_FLOAT) : 0.25 * e + t - 1.0;
+    return 10.0 * t - 0.5 * e;
+}
+
+void writeGridFile(const std::string& path, int32_t steps) {
+    constexpr int32_t kMetre = 20100, kMetrePerSecond = 20700;
+    HeaderHandle h = nullptr;
+    const auto ok = [](int32_t status, const char* what) {
+        if (status != 0) throw std::runtime_error(std::string(what) + ": status " + std::to_string(status));
+    };
+    ok(grdHeaderCreate(F_EQTIME_FIXEDSPACE_ALLITEMS, "test basin", "tool tests", 3, 2, F_ITEM_STATS_ELEMENT, &h),
+       "header");
+    ok(grdSetEqCalendarAxis(h, "2024-03-21", "06:00:00", QTY_UNIT_SECOND, 0.0, 1800.0, 0), "time axis");
+    ok(grdSetGeoInfoUTMProj(h, "UTM-32", 9.0, 54.0, 0.0), "projection");
+    const int32_t run[3] = {7, 8, 9};
+    ok(grdAddCustomBlock(h, RCF_INT4, "run", 3, run), "custom block");
+    ok(grdSetItemInfo(h, grdItemD(h, 1), 40101, "level", kMetre, RCF_FLOAT), "item 1");
+    ok(grdSetItemAxisEqD2(grdItemD(h, 1), kMetre, 4, 3, 100.0f, 200.0f, 50.0f, 25.0f), "axis 1");
+    const double xs[6] = {0.0, 1.0, 3.0, 6.0, 10.0, 15.0};
+    ok(grdSetItemInfo(h, grdItemD(h, 2), 40202, "flux", kMetrePerSecond, RCF_DOUBLE), "item 2");
+    ok(grdSetItemAxisNeqD1(grdItemD(h, 2), kMetre, 5, xs, 0), "axis 2");
+
+    FileHandle f = nullptr;
+    ok(grdFileCreate(path.c_str(), h, &f), "create");
+    const auto writeStatic = [&](int32_t quantity, const char* name, int32_t unit, int32_t type, auto axis,
+                                 const void* values) {
+        ItemHandle s = nullptr;
+        ok(grdStaticCreate(&s), "static");
+        ok(grdStaticSetHeader(h, s), "static header");
+        ok(grdSetItemInfo(h, s, quantity, name, unit, type), "static info");
+        ok(axis(s), "static axis");
+        ok(grdStaticWrite(s, f, values), "static write");
+        grdStaticDestroy(&s);
+    };
+    float depth[12];
+    for (int32_t e = 0; e < 12; ++e) depth[e] = 1.5f + static_cast<float>(e);
+    writeStatic(40103, "depth", kMetre, RCF_FLOAT,
+                [](ItemHandle s) { return grdSetItemAxisEqD2(s, kMetre, 4, 3, 100.0f, 200.0f, 50.0f, 25.0f); }, depth);
+    const int32_t flags[5] = {10, 11, 12, 13, 14};
+    writeStatic(QTY_ITEM_UNDEFINED, "flags", 0, RCF_INT4, [](ItemHandle s) { return grdSetItemAxisEqD1(s, 0, 5, 0.0f, 1.0f); },
+                flags);
+
+    for (int32_t t = 0; t < steps; ++t) {
+        float level[12];
+        double flux[5];
+        for (int32_t e = 0; e < 12; ++e) level[e] = static_cast<float>(gridValue(t, 1, e));
+        for (int32_t e = 0; e < 5; ++e) flux[e] = gridValue(t, 2, e);
+        ok(grdWriteItemTimeStep(h, f, 1800.0 * t, level), "step item 1");
+        ok(grdWriteItemTimeStep(h, f, 1800.0 * t, flux), "step item 2");
     }
-    rcfFileClose(&f);
+    ok(grdFileClose(h, &f), "close");
+    grdHeaderDestroy(&h);
 }
 
 void patchBytes(const std::string& path, uint64_t offset, const std::vector<uint8_t>& bytes) {

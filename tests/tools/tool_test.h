@@ -24,6 +24,10 @@ struct Run {
 // Runs the tool with args; sanitizer reports get exit codes of their own.
 Run runTova(const std::vector<std::string>& args);
 
+// Output with the stamps ("YYYY-MM-DD hh:mm:ss") and every occurrence of
+// path ("FILE") masked, for golden texts.
+std::string masked(std::string text, const std::string& path);
+
 // Offsets of the structure of a sound record file, from a walk through the
 // public API: the byte ranges of every record header, block start and
 // terminator, and the offsets at which a top-level record or block ends (a
@@ -48,10 +52,17 @@ void writeVreFile(const std::string& path, const std::string& firstBodyName = "h
 // 3 raw points and 2 selection values.
 void writeXsecFile(const std::string& path);
 
-// A record file of the gridded-data application ("GRD_") with a few header
-// blocks, a static section and two time steps, written through the
-// logical-block layer.
-void writeGridLikeFile(const std::string& path);
+// A gridded data file written through the library: file type 1 with an
+// equidistant calendar axis (2024-03-21 06:00:00, steps of 1800 s), a
+// projection, a custom block "run" (three integers), statistics type 2, two
+// static items ("depth", a 4 x 3 float grid with values 1.5 + element, and
+// "flags", five integers 10 + element) and two items ("level", WaterLevel
+// in m, a 4 x 3 float grid, and "flux", VelocityX in m/s, five doubles on a
+// non-equidistant axis) over `steps` time steps holding gridValue().
+void writeGridFile(const std::string& path, int32_t steps = 3);
+// Value of element e (0-based) of item n (1-based) at time step t; elements
+// 0 and 5 of "level" are the float delete value.
+double gridValue(int32_t t, int32_t n, int32_t e);
 
 // Replaces the bytes of a file from offset on.
 void patchBytes(const std::string& path, uint64_t offset, const std::vector<uint8_t>& bytes);

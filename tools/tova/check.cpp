@@ -324,6 +324,7 @@ int runCheck(const CheckOptions& options) {
     std::string report;
     if (kind == nullptr) report += "note: unknown application: only the record structure was checked\n";
     if (kind != nullptr) {
+        for (const std::string& warning : kind->warnings()) report += "warning: " + warning + "\n";
         for (const std::string& note : kind->notes()) report += "note: " + note + "\n";
     }
     report += "OK: " + std::to_string(counts.records) + " records in " + std::to_string(counts.blocks) + " blocks, " +

@@ -41,9 +41,12 @@ public:
     virtual std::optional<Problem> finish() = 0;
     // Remarks for the report that are not problems.
     const std::vector<std::string>& notes() const { return notes_; }
+    // Findings that are no damage but need the user's attention.
+    const std::vector<std::string>& warnings() const { return warnings_; }
 
 protected:
     std::vector<std::string> notes_;
+    std::vector<std::string> warnings_;
 };
 
 std::unique_ptr<KindCheck> vreCheck(const RecordFileInfo& file);

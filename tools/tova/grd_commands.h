@@ -1,9 +1,6 @@
-// The seam for gridded data files. `info`, `check`, `dump`, `stats` and `demo`
-// reach everything gridded through the declarations below. Reading the header,
-// the items and the data of a gridded file needs the gridded data-file layer of
-// the library; grd_pending.cpp stands in for it and says so. The full versions
-// (info_grd.cpp, dump.cpp, stats.cpp, demo.cpp, check_grd.cpp) replace that file
-// and implement the same declarations; main.cpp already parses their options.
+// The gridded-data commands. `info`, `check`, `dump`, `stats` and `demo` reach
+// everything gridded through the declarations below (info_grd.cpp, dump.cpp,
+// stats.cpp, demo.cpp, check_grd.cpp); main.cpp parses their options.
 #pragma once
 
 #include <cstdint>
@@ -29,6 +26,7 @@ struct DumpOptions {
     std::optional<int32_t> item;        // 1-based item number; all items when absent
     std::optional<StepRange> steps;     // all time steps when absent
     std::optional<int32_t> staticItem;  // 1-based static item: dump it instead of time steps
+    std::optional<int64_t> limit;       // values shown per item and time step
     DumpFormat format = DumpFormat::Text;
 };
 int runDump(const DumpOptions& options);
@@ -36,6 +34,7 @@ int runDump(const DumpOptions& options);
 struct StatsOptions {
     std::string file;
     std::optional<int32_t> item;  // 1-based; all items when absent
+    bool json = false;
 };
 int runStats(const StatsOptions& options);
 

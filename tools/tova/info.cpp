@@ -25,6 +25,10 @@ int runInfo(const InfoOptions& options) {
         failure = e.what();
         doc.add(kindId(file.kind), Value::object()).add("error", failure);
     }
+    // A part may also say what it could not read after what it could.
+    if (const Value* part = doc.find(kindId(file.kind)); part != nullptr && failure.empty()) {
+        if (const Value* error = part->find("error"); error != nullptr && error->text() != nullptr) failure = *error->text();
+    }
     printOut(options.json ? toJson(doc) : toText(doc));
     if (failure.empty()) return kExitOk;
     std::fprintf(stderr, "tova: %s\n", failure.c_str());

@@ -85,9 +85,13 @@ int run(int argc, char** argv) {
     CLI::Option* staticOpt =
         dumpCmd->add_option("--static", dumpStatic, "static item N (1-based) instead of time steps")
             ->check(CLI::PositiveNumber)
+            ->excludes(itemOpt)
             ->excludes(stepOpt)
             ->excludes(stepsOpt);
     dumpCmd->add_option("--format", dumpFormat, "text or csv")->check(CLI::IsMember({"text", "csv"}));
+    int64_t dumpLimit = 0;
+    CLI::Option* limitOpt = dumpCmd->add_option("--limit", dumpLimit, "at most N values per item and time step")
+                                ->check(CLI::NonNegativeNumber);
 
     StatsOptions stats;
     int32_t statsItem = 0;
@@ -95,6 +99,7 @@ int run(int argc, char** argv) {
     statsCmd->add_option("FILE", stats.file, "the gridded data file")->required();
     CLI::Option* statsItemOpt =
         statsCmd->add_option("--item", statsItem, "only item N (1-based)")->check(CLI::PositiveNumber);
+    statsCmd->add_flag("--json", stats.json, "print JSON instead of text");
 
     CheckOptions check;
     CLI::App* checkCmd = app.add_subcommand("check", "Structural check of a file; exit status 1 when it is damaged");
@@ -139,6 +144,7 @@ int run(int argc, char** argv) {
         if (itemOpt->count() != 0) dump.item = dumpItem;
         if (stepOpt->count() != 0) dump.steps = StepRange{dumpStep, dumpStep};
         if (staticOpt->count() != 0) dump.staticItem = dumpStatic;
+        if (limitOpt->count() != 0) dump.limit = dumpLimit;
         dump.format = dumpFormat == "csv" ? DumpFormat::Csv : DumpFormat::Text;
         return runDump(dump);
     }

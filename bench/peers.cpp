@@ -613,6 +613,12 @@ void quietHdf5() {
     if (setAuto != nullptr) setAuto(0 /* H5E_DEFAULT */, nullptr, nullptr);
 }
 
+// The netCDF-C version without its build date.
+std::string netcdfVersion() {
+    const std::string text = nc_inq_libvers();
+    return text.substr(0, text.find(' '));
+}
+
 // The version of the HDF5 library that netCDF loaded.
 std::string hdf5Version() {
     using GetVersion = int (*)(unsigned*, unsigned*, unsigned*);
@@ -772,7 +778,7 @@ public:
         std::printf("Times are %s. Libraries: tova %d, netCDF-C %s, HDF5 %s. Data files in %s.\n",
                     Clock::wall ? "wall-clock time"
                                 : "process CPU time (user and system; the thread workload: wall-clock time)",
-                    grdGetVersionCurrent(), nc_inq_libvers(), hdf5Version().c_str(), dir_.string().c_str());
+                    grdGetVersionCurrent(), netcdfVersion().c_str(), hdf5Version().c_str(), dir_.string().c_str());
         if (opt_.runs(1)) largeGrids();
         if (opt_.runs(2)) timeSeries();
         if (opt_.runs(3)) randomAccess();

@@ -360,7 +360,9 @@ bool openStream(RcfFile* h, const char* path, const char* mode) {
     std::string modeBuffer;
     h->stream = std::fopen(path, withCloseOnExec(mode, modeBuffer));
     if (h->stream == nullptr) return false;
-    const size_t size = std::strcmp(mode, "rb") == 0 ? kRcfReadBufferSize : kRcfStreamBufferSize;
+    // Only files being created ("wb", "wb+") write straight on; the others jump.
+    const bool jumps = std::strcmp(mode, "rb") == 0 || std::strcmp(mode, "rb+") == 0;
+    const size_t size = jumps ? kRcfReadBufferSize : kRcfStreamBufferSize;
     h->ioBuffer.reset(new (std::nothrow) char[size]);
     if (h->ioBuffer) std::setvbuf(h->stream, h->ioBuffer.get(), _IOFBF, size);
     return true;

@@ -13,7 +13,9 @@
 #include <vector>
 
 #include "grd/fileio.h"
+#include "qty/qty.h"
 #include "rcf/rcf_internal.h"
+#include "tova/grd.h"
 #include "tova/vre.h"
 #include "tova/xfs.h"
 
@@ -346,6 +348,168 @@ void vreSeeds() {
     vreVersion100();
 }
 
+
+// ---- Gridded data files -----------------------------------------------------
+
+// WaterLevel in metres: an item whose values the unit conversion modes change.
+constexpr int32_t kWaterLevel = 40101;
+constexpr int32_t kMetre = 20100;
+
+void ok(int32_t status, const char* what) { check(status == 0, what); }
+
+// Item n of the header: name, quantity, unit, data type; the axis is set by
+// the caller.
+ItemHandle grdItem(HeaderHandle h, int32_t n, int32_t dataType, bool waterLevel = false) {
+    ItemHandle item = grdItemD(h, n);
+    const std::string name = "item " + std::to_string(n);
+    ok(grdSetItemInfo(h, item, waterLevel ? kWaterLevel : QTY_ITEM_UNDEFINED, name.c_str(),
+                      waterLevel ? kMetre : 0, dataType),
+       "grd item info");
+    return item;
+}
+
+// A static item of count values first, first + 1, ... (float or double) on
+// an equidistant 1-D axis (a single value when count is 1).
+void grdStatic(HeaderHandle h, FileHandle f, const char* name, int32_t dataType, int32_t count, double first) {
+    ItemHandle item = nullptr;
+    ok(grdStaticCreate(&item), "grd static create");
+    ok(grdSetItemInfo(h, item, QTY_ITEM_UNDEFINED, name, 0, dataType), "grd static info");
+    ok(count == 1 ? grdSetItemAxisEqD0(item, 0) : grdSetItemAxisEqD1(item, 0, count, 0.0f, 2.0f), "grd static axis");
+    std::vector<double> doubles(static_cast<size_t>(count));
+    std::vector<float> floats(static_cast<size_t>(count));
+    for (int32_t k = 0; k < count; ++k) {
+        doubles[size_t(k)] = first + k;
+        floats[size_t(k)] = static_cast<float>(first + k);
+    }
+    ok(grdStaticWrite(item, f, dataType == RCF_DOUBLE ? static_cast<const void*>(doubles.data()) : floats.data()),
+       "grd static write");
+    grdStaticDestroy(&item);
+}
+
+// Writes steps time steps of every item: item i, step s, element e holds
+// s * 100 + i * 10 + e / 4 (a delete value at element 1 of every third step),
+// with the time times[s].
+void grdSteps(HeaderHandle h, FileHandle f, const std::vector<double>& times) {
+    for (size_t s = 0; s < times.size(); ++s) {
+        for (int32_t i = 1; i <= grdGetNoOfItems(h); ++i) {
+            ItemHandle item = grdItemD(h, i);
+            int32_t dataType = 0;
+            grdGetItemInfo_(item, nullptr, nullptr, nullptr, &dataType);
+            const auto n = static_cast<size_t>(grdGetItemElements(item));
+            std::vector<double> doubles(n);
+            std::vector<float> floats(n);
+            for (size_t e = 0; e < n; ++e) {
+                doubles[e] = double(s) * 100 + i * 10 + double(e) / 4;
+                floats[e] = static_cast<float>(doubles[e]);
+            }
+            if (s % 3 == 2 && n > 1) {
+                doubles[1] = grdGetDeleteValDouble(h);
+                floats[1] = grdGetDeleteValFloat(h);
+            }
+            const void* values = dataType == RCF_DOUBLE ? static_cast<const void*>(doubles.data()) : floats.data();
+            ok(grdWriteItemTimeStep(h, f, times[s], values), "grd time step");
+        }
+    }
+}
+
+// Creates the seed file of a filled header: static items by statics, then
+// the time steps, then closes it.
+template <class Statics>
+void grdFile(const char* name, HeaderHandle h, const std::vector<double>& times, Statics statics) {
+    {
+        Seed seed("fuzz_grd", name);
+        FileHandle f = nullptr;
+        ok(grdFileCreate(seed.path(), h, &f), "grd create");
+        if (f != nullptr) {
+            statics(f);
+            grdSteps(h, f, times);
+            ok(grdFileClose(h, &f), "grd close");
+        }
+    }
+    grdHeaderDestroy(&h);
+}
+
+HeaderHandle grdHeader(int32_t fileType, int32_t items, int32_t statsType) {
+    HeaderHandle h = nullptr;
+    ok(grdHeaderCreate(fileType, "seed file", "make_corpus", 3, items, statsType, &h), "grd header");
+    return h;
+}
+
+// File type 1, equidistant time axis: a float grid on a 2-D axis and a
+// double profile on a 1-D axis, item-global statistics, one static item.
+void grdEquidistant() {
+    HeaderHandle h = grdHeader(F_EQTIME_FIXEDSPACE_ALLITEMS, 2, F_ITEM_STATS_GLOBAL);
+    ok(grdSetEqTimeAxis(h, QTY_UNIT_SECOND, 0.0, 60.0, 0), "grd time axis");
+    ok(grdSetItemAxisEqD2(grdItem(h, 1, RCF_FLOAT, true), 0, 3, 2, 0.0f, 0.0f, 10.0f, 10.0f), "grd axis");
+    ok(grdSetItemAxisEqD1(grdItem(h, 2, RCF_DOUBLE), 0, 4, 1.0f, 0.5f), "grd axis");
+    grdFile("eq-time-d2-d1", h, {0, 1, 2}, [&](FileHandle f) { grdStatic(h, f, "bathymetry", RCF_FLOAT, 6, -3.0); });
+}
+
+// File type 4 on a non-equidistant calendar axis with per-element
+// statistics: a single value and a non-equidistant 1-D profile; two static
+// items, a projection and a custom block.
+void grdCalendar() {
+    HeaderHandle h = grdHeader(F_NEQTIME_FIXEDSPACE_ALLITEMS, 2, F_ITEM_STATS_ELEMENT);
+    ok(grdSetNeqCalendarAxis(h, "2020-02-28", "23:00:00", QTY_UNIT_SECOND, 0.0, 0), "grd calendar axis");
+    ok(grdSetGeoInfoUTMProj(h, "UTM-32", 9.0, 54.5, 0.0), "grd projection");
+    const int32_t marks[3] = {7, -1, 300};
+    ok(grdAddCustomBlock(h, RCF_INT4, "marks", 3, marks), "grd custom block");
+    ok(grdSetItemAxisEqD0(grdItem(h, 1, RCF_DOUBLE, true), 0), "grd axis");
+    const double xs[4] = {0.0, 1.0, 3.0, 7.5};
+    ok(grdSetItemAxisNeqD1(grdItem(h, 2, RCF_FLOAT), 0, 3, xs, 0), "grd axis");
+    grdFile("neq-calendar-stats", h, {0.0, 1800.0, 5400.0, 90000.0}, [&](FileHandle f) {
+        grdStatic(h, f, "depth", RCF_DOUBLE, 3, 10.0);
+        grdStatic(h, f, "level", RCF_FLOAT, 1, 0.5);
+    });
+}
+
+// File type 1 on an equidistant calendar axis, compressed through x and y
+// encoding keys (written as the first static items): a float and a double
+// grid on 2-D axes of which the keys hold 5 of 12 points, and an
+// uncompressed single value. Per-element statistics.
+void grdCompressed() {
+    HeaderHandle h = grdHeader(F_EQTIME_FIXEDSPACE_ALLITEMS, 3, F_ITEM_STATS_ELEMENT);
+    ok(grdSetEqCalendarAxis(h, "2024-03-21", "06:00:00", QTY_UNIT_SECOND, 0.0, 1800.0, 0), "grd calendar axis");
+    const int32_t xKey[5] = {0, 3, 1, 2, 0};
+    const int32_t yKey[5] = {0, 0, 1, 2, 2};
+    ok(grdSetEncodeKey(h, xKey, yKey, nullptr, 5), "grd encoding keys");
+    ok(grdSetItemAxisEqD2(grdItem(h, 1, RCF_FLOAT, true), 0, 4, 3, 0.0f, 0.0f, 1.0f, 1.0f), "grd axis");
+    ok(grdSetItemAxisEqD2(grdItem(h, 2, RCF_DOUBLE), 0, 4, 3, 0.0f, 0.0f, 1.0f, 1.0f), "grd axis");
+    ok(grdSetItemAxisEqD0(grdItem(h, 3, RCF_FLOAT), 0), "grd axis");
+    grdFile("compressed-eq-calendar", h, {0, 1, 2}, [](FileHandle) {});
+}
+
+// File type 4 on a non-equidistant time axis: no static items, many short
+// time steps (searches jump over them).
+void grdManySteps() {
+    HeaderHandle h = grdHeader(F_NEQTIME_FIXEDSPACE_ALLITEMS, 2, F_ITEM_STATS_GLOBAL);
+    ok(grdSetNeqTimeAxis(h, QTY_UNIT_SECOND, 0.0, 0), "grd time axis");
+    ok(grdSetItemAxisEqD0(grdItem(h, 1, RCF_FLOAT), 0), "grd axis");
+    ok(grdSetItemAxisEqD1(grdItem(h, 2, RCF_DOUBLE, true), 0, 2, 0.0f, 1.0f), "grd axis");
+    std::vector<double> times;
+    for (int s = 0; s < 12; ++s) times.push_back(s * 2.5 + (s % 2));
+    grdFile("neq-time-many-steps", h, times, [](FileHandle) {});
+}
+
+// A header with static items and no dynamic data.
+void grdStaticOnly() {
+    HeaderHandle h = grdHeader(F_EQTIME_FIXEDSPACE_ALLITEMS, 1, F_ITEM_STATS_ELEMENT);
+    ok(grdSetEqTimeAxis(h, QTY_UNIT_SECOND, 0.0, 1.0, 0), "grd time axis");
+    ok(grdSetItemAxisEqD1(grdItem(h, 1, RCF_FLOAT), 0, 2, 0.0f, 1.0f), "grd axis");
+    grdFile("static-only", h, {}, [&](FileHandle f) {
+        grdStatic(h, f, "a", RCF_DOUBLE, 4, 1.0);
+        grdStatic(h, f, "b", RCF_FLOAT, 2, -1.0);
+    });
+}
+
+void grdSeeds() {
+    grdEquidistant();
+    grdCalendar();
+    grdCompressed();
+    grdManySteps();
+    grdStaticOnly();
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -355,10 +519,10 @@ int main(int argc, char** argv) {
     }
     g_out = argv[1];
     fs::create_directories(g_out);
-    // Each target's seeds; a new target (fuzz_grd for the gridded data files)
-    // adds its own generator here.
+    // Each target's seeds.
     rcfSeeds();
     xfsSeeds();
     vreSeeds();
+    grdSeeds();
     return g_failures == 0 ? 0 : 1;
 }

@@ -20,20 +20,16 @@ namespace {
 
 constexpr const char* kModule = kModGrdHeader;
 
-int32_t g_failAllocation = 0;  // test hook: countdown to a failing allocation
-
 char g_emptyText[1] = {0};  // shared by every empty GrdText, never written
 
 }  // namespace
 
 // ---- Allocation ----------------------------------------------------------------
 
-bool grdAllocationFails() noexcept {
-    if (g_failAllocation <= 0) return false;
-    return --g_failAllocation == 0;
-}
+// The hook is the record layer's: one countdown over every allocation.
+bool grdAllocationFails() noexcept { return rcfAllocationFails(); }
 
-void grdTestFailAllocation(int32_t nth) noexcept { g_failAllocation = nth > 0 ? nth : 0; }
+void grdTestFailAllocation(int32_t nth) noexcept { rcfTestFailAllocation(nth); }
 
 void* grdAllocRaw(size_t bytes) noexcept {
     if (grdAllocationFails()) return nullptr;

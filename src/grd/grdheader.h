@@ -30,6 +30,7 @@ inline constexpr const char* kModGrdTimeAxis = "..\\grd\\grdtimeaxis";
 // nothrow constructions below), so that a test can make the n-th one fail.
 void* grdAllocRaw(size_t bytes) noexcept;  // zero-filled; null on failure
 // Test hook: the n-th allocation from now fails (1 = the next); 0 disarms.
+// The countdown covers the record layer's allocations as well.
 void grdTestFailAllocation(int32_t nth) noexcept;
 // Consumes one allocation of the test hook; true when it is to fail.
 bool grdAllocationFails() noexcept;

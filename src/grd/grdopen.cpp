@@ -111,11 +111,14 @@ bool isKeyItem(const GrdStaticItem* item) {
 // Loads the encoding keys of a compressed file from its first static items,
 // by position: X, Y, Z. The element count of the X key becomes the key
 // length; a shorter Y or Z key is zero-padded to it, so that no key can be
-// read past its end. The file is left after the static items read.
+// read past its end. The file is left after the keys: a static item that is
+// no key (the caller's first one, in a file with fewer than three keys) is
+// put back, so that the caller's first static read still yields it.
 int32_t loadEncodingKeys(HeaderHandle header, FileHandle file) {
     GrdArray<int32_t>* slots[3] = {&header->keyX, &header->keyY, &header->keyZ};
     for (GrdArray<int32_t>* slot : slots) {
         int32_t status = F_NO_ERROR;
+        const int64_t before = rcfTell64(file);
         ItemHandle handle = grdStaticRead(file, &status);
         if (handle == nullptr) return status;  // fewer keys than three, or a failure
         const GrdStaticItem* item = grdAsStatic(handle);
@@ -127,7 +130,11 @@ int32_t loadEncodingKeys(HeaderHandle header, FileHandle file) {
             if (key && length > 0) std::memcpy(key.get(), item->values.get(), static_cast<size_t>(length) * 4);
         }
         grdStaticDestroy(&handle);
-        if (!isKey) continue;
+        if (!isKey) {
+            const auto at = static_cast<uint64_t>(before);
+            rcfSeek64(file, static_cast<uint32_t>(at), static_cast<uint32_t>(at >> 32), 0);
+            return rcfPeekError(file) > F_EOF ? report(header, file, F_ERR_SEEK, __LINE__) : F_NO_ERROR;
+        }
         if (!key) return report(header, file, F_ERR_MEMORY, __LINE__);
         if (slot == &header->keyX) {
             if (length > INT32_MAX) return report(header, file, F_ERR_VALUE, __LINE__);

@@ -143,7 +143,7 @@ void stampNow(int16_t stamp[6]) {
 }
 
 char* newText(const std::string& text) {
-    char* copy = new (std::nothrow) char[text.size() + 1];
+    char* copy = rcfAllocationFails() ? nullptr : new (std::nothrow) char[text.size() + 1];
     if (copy != nullptr) std::memcpy(copy, text.c_str(), text.size() + 1);
     return copy;
 }
@@ -351,7 +351,7 @@ void readStampGroup(RcfFile* h, int16_t stamp[6], uint32_t* version, uint32_t* a
 using FilePtr = std::unique_ptr<RcfFile>;
 
 FilePtr newFile() {
-    FilePtr h(new (std::nothrow) RcfFile());
+    FilePtr h(rcfAllocationFails() ? nullptr : new (std::nothrow) RcfFile());
     if (h) h->openClock = clockMs();
     return h;
 }
@@ -363,7 +363,8 @@ bool openStream(RcfFile* h, const char* path, const char* mode) {
     // Only files being created ("wb", "wb+") write straight on; the others jump.
     const bool jumps = std::strcmp(mode, "rb") == 0 || std::strcmp(mode, "rb+") == 0;
     const size_t size = jumps ? kRcfReadBufferSize : kRcfStreamBufferSize;
-    h->ioBuffer.reset(new (std::nothrow) char[size]);
+    // Without a buffer of its own the stream keeps the C library's.
+    h->ioBuffer.reset(rcfAllocationFails() ? nullptr : new (std::nothrow) char[size]);
     if (h->ioBuffer) std::setvbuf(h->stream, h->ioBuffer.get(), _IOFBF, size);
     return true;
 }
@@ -569,6 +570,21 @@ int32_t rcfFileOpenEdit(const char* path, FileHandle* out, rcfAppIdent appIdent,
 }
 
 uint32_t rcfClockMs() { return clockMs(); }
+
+namespace {
+// Countdown of the allocation test hook; 0 when disarmed (the usual case: one
+// relaxed load per allocation, safe while threads allocate).
+std::atomic<int32_t> g_failAllocation{0};
+}  // namespace
+
+bool rcfAllocationFails() noexcept {
+    if (g_failAllocation.load(std::memory_order_relaxed) <= 0) return false;
+    return g_failAllocation.fetch_sub(1, std::memory_order_relaxed) == 1;
+}
+
+int32_t rcfTestFailAllocation(int32_t nth) noexcept {
+    return g_failAllocation.exchange(nth > 0 ? nth : 0, std::memory_order_relaxed);
+}
 
 bool rcfFits(FileHandle h, uint64_t bytes) { return h != nullptr && fitsInFile(h, bytes); }
 
@@ -867,7 +883,7 @@ void* TOVA_CALL rcfLrecReadAlloc(FileHandle h, int32_t* type, uint32_t* count) {
             RCF_FAIL(h, F_ERR_READ);
             return nullptr;
         }
-        void* buffer = std::malloc(static_cast<size_t>(bytes));
+        void* buffer = rcfAllocationFails() ? nullptr : std::malloc(static_cast<size_t>(bytes));
         if (buffer == nullptr) {
             RCF_FAIL(h, F_ERR_MEMORY);
             return nullptr;

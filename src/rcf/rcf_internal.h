@@ -83,6 +83,14 @@ int32_t rcfFileOpenEdit(const char* path, FileHandle* out, rcfAppIdent appIdent,
 int32_t rcfFileOpen(const char* path, FileHandle* out, const char* mode, rcfAppIdent appIdent,
                     uint32_t* appTagOut);
 void rcfSeekAppBase(FileHandle h);
+// Test hook shared by every allocation of the library (record layer and data
+// layer): after rcfTestFailAllocation(n) the n-th allocation from then on
+// fails (1 = the next); 0 disarms. Returns the countdown it replaces: 0 when
+// the failure asked for before has happened (or none was asked for).
+// rcfAllocationFails consumes one allocation and says whether it is to fail.
+bool rcfAllocationFails() noexcept;
+int32_t rcfTestFailAllocation(int32_t nth) noexcept;
+
 // Monotonic milliseconds, the clock of openClock (flush throttles compare against it).
 uint32_t rcfClockMs();
 // This layer's own status reporter (module "rcf"); returns code.

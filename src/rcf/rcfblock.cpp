@@ -16,7 +16,7 @@ int32_t fail(RcfFile* h, int32_t code, int32_t line) { return h->error = rcfRepo
 }  // namespace
 
 LrecNode* rcfLrecNodeNew(int32_t type, uint32_t count, const void* data, int32_t copy, LrecNode* appendTo) {
-    auto* node = static_cast<LrecNode*>(std::calloc(1, sizeof(LrecNode)));
+    auto* node = rcfAllocationFails() ? nullptr : static_cast<LrecNode*>(std::calloc(1, sizeof(LrecNode)));
     if (node == nullptr) return nullptr;
     node->type = type;
     node->count = count;
@@ -24,7 +24,7 @@ LrecNode* rcfLrecNodeNew(int32_t type, uint32_t count, const void* data, int32_t
         // A size of 0 (reported by rcfRecordBytes) still makes a node, without data.
         const uint32_t bytes = rcfRecordBytes(type, count);
         if (bytes != 0) {
-            void* buffer = std::malloc(bytes);
+            void* buffer = rcfAllocationFails() ? nullptr : std::malloc(bytes);
             if (buffer == nullptr) {
                 std::free(node);
                 return nullptr;

@@ -17,6 +17,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include "test_harden_support.h"
 #include "test_lifecycle_support.h"
 
 using namespace grdtest;
@@ -103,6 +104,80 @@ TEST_F(WriteFailureTest, CreateThatCannotWriteItsHeaderLeavesNothing) {
     EXPECT_NE(r[0], 0);
     EXPECT_EQ(r[1], 1);
     EXPECT_FALSE(std::filesystem::exists(path));
+}
+
+
+// Time steps under the limit: two float items of 40000 values (160 kB a
+// record, most of the stream buffer) per step on an equidistant 1-D axis;
+// the limit falls inside step 3. The write that crosses it gives 2002 and
+// the steps before stay readable.
+class DynamicWriteFailure : public FileTest {
+protected:
+    static constexpr int32_t kValues = 40000;
+    static constexpr int32_t kSteps = 6;
+
+    void SetUp() override {
+        FileTest::SetUp();
+        makeFileHeader(2);
+        for (int32_t i = 1; i <= 2; ++i) ASSERT_EQ(grdSetItemAxisEqD1(grdItemD(header_, i), 0, kValues, 0.0f, 1.0f), 0);
+    }
+
+    static std::vector<float> values(int32_t step, int32_t item) {
+        std::vector<float> v(kValues);
+        for (int32_t e = 0; e < kValues; ++e) v[size_t(e)] = static_cast<float>(hardtest::richValue(step, item, e));
+        return v;
+    }
+};
+
+TEST_F(DynamicWriteFailure, TheCrossingWriteGives2002TheFileClosesAndEarlierStepsReadBack) {
+    const std::string path = dir_.file("steps.grd");
+    // Statuses sent back: each write's, until the first failure; then the
+    // close's and whether the handle was left open.
+    const std::vector<int32_t> r = inLimitedChild(3 * 320 * 1024, [&] {
+        std::vector<int32_t> out;
+        FileHandle file = nullptr;
+        if (grdFileCreate(path.c_str(), header_, &file) != 0) return std::vector<int32_t>{-1};
+        int32_t status = 0;
+        for (int32_t s = 0; s < kSteps && status == 0; ++s) {
+            for (int32_t i = 1; i <= 2 && status == 0; ++i) {
+                status = grdWriteItemTimeStep(header_, file, s, values(s, i).data());
+                out.push_back(status);
+            }
+        }
+        out.push_back(grdFileClose(header_, &file));
+        out.push_back(file != nullptr ? 1 : 0);
+        if (file != nullptr) rcfFileClose(&file);
+        return out;
+    });
+    ASSERT_GE(r.size(), 3u);
+    const std::vector<int32_t> writes(r.begin(), r.end() - 2);
+    const int32_t closed = r[r.size() - 2];
+    const bool leftOpen = r.back() != 0;
+    // The writes succeed up to the one that crossed the limit: 2002 there.
+    ASSERT_EQ(writes.back(), 2002);
+    for (size_t k = 0; k + 1 < writes.size(); ++k) EXPECT_EQ(writes[k], 0) << k;
+    const auto completeSteps = static_cast<int32_t>((writes.size() - 1) / 2);
+    EXPECT_GE(completeSteps, 2);
+    EXPECT_LT(completeSteps, kSteps);
+    // The close reports the incomplete file, but does not keep the handle.
+    EXPECT_NE(closed, 0);
+    EXPECT_FALSE(leftOpen);
+
+    // Every step written before the failure reads back.
+    openRead(path);
+    int32_t unit = 0, steps = 0, first = 0;
+    double start = 0, step = 0;
+    ASSERT_EQ(grdGetEqTimeAxis(header_, &unit, nullptr, &start, &step, &steps, &first), 0);
+    EXPECT_EQ(steps, completeSteps);
+    std::vector<float> got(kValues);
+    for (int32_t s = 0; s < completeSteps; ++s) {
+        for (int32_t i = 1; i <= 2; ++i) {
+            double time = -1;
+            ASSERT_EQ(grdReadItemTimeStep(header_, file_, &time, got.data()), 0) << s << " " << i;
+            EXPECT_EQ(got, values(s, i)) << s << " " << i;
+        }
+    }
+    close();
 }
 
 }  // namespace

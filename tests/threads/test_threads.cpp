@@ -1,7 +1,8 @@
 // Threads: distinct files are independent. Eight threads at once each create,
 // write, close, open and read back their own record file (through the
-// file-open layer, whose failures reach the process-wide handler table), VRE
-// file and cross-section file, while unit conversions run beside them. The
+// file-open layer, whose failures reach the process-wide handler table),
+// gridded data file, VRE file and cross-section file, while unit conversions
+// run beside them. The
 // CI runs this program under ThreadSanitizer, which fails it on any data
 // race; tracing is off and handlers are installed before the threads start.
 #include <gtest/gtest.h>
@@ -15,6 +16,7 @@
 #include <vector>
 
 #include "common/testutil.h"
+#include "grd/test_harden_support.h"
 #include "grd/fileio.h"
 #include "qty/qty.h"
 #include "qty/qty_tables.h"
@@ -69,6 +71,19 @@ Result recordFile(const std::string& path, int seed) {
     FFreeLogicalBlock(read);
     if (FCloseFile(&f) != 0) result = "record file: close";
     return result;
+}
+
+// A gridded data file with a static item, a compressed item, per-element
+// statistics and a calendar axis, written and read back completely; what is
+// read must be what a single thread read from the same file before.
+Result gridFile(const std::string& path, const hardtest::Contents& expected) {
+    const hardtest::Run written = hardtest::writeRichFile(path);
+    if (!written.ok()) return "grd: write " + std::to_string(written.firstFailure);
+    const hardtest::Contents read = hardtest::readEverything(path);
+    if (!read.run.ok()) return "grd: read " + std::to_string(read.run.firstFailure);
+    if (read.values != expected.values || read.times != expected.times || read.staticItems != expected.staticItems)
+        return "grd: values";
+    return {};
 }
 
 Result vreFile(const std::string& path, int seed) {
@@ -147,6 +162,11 @@ TEST(Threads, DistinctFilesOnEightThreadsAtOnce) {
     grdAddErrorHandler(F_ERR_NOT_BLOCK, countReport);
     g_notBlockReports = 0;
     testutil::TempDir dir;
+    // The gridded file as one thread reads it.
+    ASSERT_TRUE(hardtest::writeRichFile(dir.file("reference.grd")).ok());
+    const hardtest::Contents reference = hardtest::readEverything(dir.file("reference.grd"));
+    ASSERT_TRUE(reference.run.ok());
+    ASSERT_EQ(reference.stepsRead, hardtest::kRichSteps);
     std::vector<Result> failures(kThreads);
     std::latch start(kThreads);
     std::vector<std::thread> threads;
@@ -155,8 +175,8 @@ TEST(Threads, DistinctFilesOnEightThreadsAtOnce) {
             start.arrive_and_wait();
             const std::string base = dir.file("t" + std::to_string(t));
             for (int round = 0; round < kRounds && failures[t].empty(); ++round) {
-                for (Result r : {recordFile(base + ".rcf", t), vreFile(base + ".vre", t), xfsFile(base + ".xfs", t),
-                                 conversions(t)}) {
+                for (Result r : {recordFile(base + ".rcf", t), gridFile(base + ".grd", reference),
+                                 vreFile(base + ".vre", t), xfsFile(base + ".xfs", t), conversions(t)}) {
                     if (failures[t].empty() && !r.empty()) failures[t] = r + " (round " + std::to_string(round) + ")";
                 }
             }

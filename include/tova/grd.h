@@ -395,6 +395,28 @@ TOVA_API int32_t TOVA_CALL grdFileFlushTimeStep(HeaderHandle header, FileHandle 
 TOVA_API int32_t TOVA_CALL grdFileClose(HeaderHandle header, FileHandle* file);
 TOVA_API int32_t TOVA_CALL grdFileDelete(const char* name);
 
+/* ---- Beyond the file-lifecycle calls: recovery after a crash ---------------
+ * A writer killed before it closed its file leaves every time step it had
+ * completely written on disk, but the header may count fewer (it is
+ * rewritten at most once a second) and an unfinished time step may follow.
+ * A time step is complete when its time-step block and every item record are
+ * whole. Both calls walk the dynamic data record by record without reading
+ * the values, and trust no count or length of the file. Out pointers may be
+ * null. Statuses: 0, or the reader's status for a file damaged before its
+ * dynamic data; 2018 for file types whose time steps are not of fixed
+ * layout (only file types 1 and 4 are walked). */
+/* Counts without changing the file: complete time steps, time steps the
+ * header counts, and in *tailBytes the bytes that follow the last complete
+ * time step (an unfinished one; 0 when the file ends with a complete step). */
+TOVA_API int32_t TOVA_CALL grdFileScan(const char* name, int32_t* stepsFound, int32_t* stepsInHeader,
+                                       int64_t* tailBytes);
+/* As grdFileScan, then, when the header's time-step count (or, for a
+ * non-equidistant axis, its time span) disagrees with the complete time
+ * steps, rewrites them in place. A consistent file is not modified. A
+ * trailing unfinished time step stays on disk, uncounted; grdFileAppend
+ * continues after the last complete time step. */
+TOVA_API int32_t TOVA_CALL grdFileRecover(const char* name, int32_t* stepsFound, int32_t* stepsInHeader);
+
 /* ---- Static items ------------------------------------------------------------
  * A static item is an item that carries its own values; it is usable
  * wherever an ItemHandle is taken (info and axis setters and getters). */

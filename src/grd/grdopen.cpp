@@ -14,9 +14,16 @@
 #include <string>
 #include <system_error>
 
+#ifdef _WIN32
+#include <io.h>
+#else
+#include <unistd.h>
+#endif
+
 #include "common/capi.h"
 #include "grd/fileio.h"
 #include "grd/grdio.h"
+#include "grd/grdrecover.h"
 #include "grd/grdstatic.h"
 #include "grd/grdstream.h"
 #include "qty/qty.h"
@@ -28,6 +35,11 @@ constexpr const char* kModule = "..\\grd\\grdopen";
 
 int32_t report(HeaderHandle header, FileHandle file, int32_t code, int32_t line) {
     return grdReportError(header, file, 0, code, kModule, line);
+}
+
+void seekTo(FileHandle file, int64_t offset) {
+    const auto u = static_cast<uint64_t>(offset);
+    rcfSeek64(file, static_cast<uint32_t>(u), static_cast<uint32_t>(u >> 32), 0);
 }
 
 // ---- Names -----------------------------------------------------------------------
@@ -185,6 +197,36 @@ int32_t sectionAtEnd(FileHandle file, uint32_t* section) {
     return error > F_EOF ? report(nullptr, file, error, __LINE__) : F_NO_ERROR;
 }
 
+// Cuts the file at offset: what follows is an unfinished time step that the
+// data written next must replace, not leave behind.
+bool truncateAt(FileHandle file, int64_t offset) {
+    seekTo(file, offset);
+    if (std::fflush(file->stream) != 0) return false;
+#ifdef _WIN32
+    if (_chsize_s(_fileno(file->stream), offset) != 0) return false;
+#else
+    if (ftruncate(fileno(file->stream), static_cast<off_t>(offset)) != 0) return false;
+#endif
+    file->knownSize = offset;
+    return true;
+}
+
+// Positions a file opened for appending after its last complete time step.
+// The cursor counts the complete time steps on disk, so that a file whose
+// header lags behind its data (a writer that was killed) is continued where
+// its data end and its header is right again at close; an unfinished time
+// step after them is cut off.
+int32_t appendAfterLastStep(HeaderHandle header, FileHandle file) {
+    GrdStepWalk walk;
+    const int32_t status = grdWalkTimeSteps(header, file, &walk);
+    if (status != F_NO_ERROR) return status;
+    if (walk.partial() && !truncateAt(file, walk.end)) return report(header, file, F_ERR_WRITE, __LINE__);
+    seekTo(file, walk.end);
+    file->ownerMark = walk.section;
+    grdApplyStepWalk(header, walk);
+    return F_NO_ERROR;
+}
+
 // ---- Creating ------------------------------------------------------------------
 
 // Writes one encoding key as a static item.
@@ -303,17 +345,22 @@ int32_t appendFile(const char* name, HeaderHandle* outHeader, FileHandle* outFil
         trace.print("Error %d", status);
         return status;
     }
-    uint32_t section = kSectionHeader;
-    status = sectionAtEnd(opened.file, &section);
-    if (status != F_NO_ERROR) return status;
-    rcfSeek64(opened.file, 0, 0, 2);  // the end of the file
+    if (grdStepsWalkable(opened.header->fileType)) {
+        status = appendAfterLastStep(opened.header, opened.file);
+        if (status != F_NO_ERROR) return status;
+    } else {
+        uint32_t section = kSectionHeader;
+        status = sectionAtEnd(opened.file, &section);
+        if (status != F_NO_ERROR) return status;
+        rcfSeek64(opened.file, 0, 0, 2);  // the end of the file
+        opened.file->ownerMark = section;
+        GrdTimeValues* values = grdTimeAxisValues(opened.header);
+        if (values != nullptr) opened.header->timeStepsDone = values->timeSteps;
+    }
     if (rcfPeekError(opened.file) != F_NO_ERROR) {
         trace.print("F_ERR_SEEK");
         return report(opened.header, opened.file, F_ERR_SEEK, __LINE__);
     }
-    opened.file->ownerMark = section;
-    const GrdTimeValues* values = grdTimeAxisValues(opened.header);
-    if (values != nullptr) opened.header->timeStepsDone = values->timeSteps;
     trace.print("F_NO_ERROR = OK");
     opened.handOver(outHeader, outFile);
     return F_NO_ERROR;
@@ -326,30 +373,33 @@ int32_t appendFile(const char* name, HeaderHandle* outHeader, FileHandle* outFil
 // once a second.
 int32_t forceFlag(HeaderHandle header) { return header->timeStepsDone < 2 && header->nextItem == 0 ? 1 : 0; }
 
+// A file that holds nothing after its header gets the empty block that
+// starts its dynamic section: a header is read up to the block that follows
+// it, so a header alone could not be read back. The file position stays in
+// front of that block, so the data written next (a 40000 block of the same
+// length, or the 50000 block itself) replaces it and the file ends up as if
+// the block had never been written. Only at the end of the file: what
+// follows the header is never written over.
+int32_t markEndOfHeader(HeaderHandle header, FileHandle file) {
+    if (file->readOnly != 0 || file->ownerMark != kSectionHeader || file->error != F_NO_ERROR) return F_NO_ERROR;
+    const int64_t at = rcfTell64(file);
+    rcfSeek64(file, 0, 0, 2);
+    if (rcfTell64(file) == at) {
+        const int32_t status = grdCheckWriteLB(header, kTagDynamicStart, nullptr, file, kModule, __LINE__);
+        if (status != F_NO_ERROR) return status;
+    }
+    seekTo(file, at);
+    return F_NO_ERROR;
+}
+
 template <class Update>
 int32_t flushFile(HeaderHandle header, FileHandle file, Update update) {
     // A file of the legacy translator would be flushed by it here; none ships.
     int32_t status = grdCheckHeaderFile(header, file, kModule, __LINE__);
     if (status != F_NO_ERROR) return status;
-    status = update(header, forceFlag(header), file);
+    status = markEndOfHeader(header, file);
+    if (status == F_NO_ERROR) status = update(header, forceFlag(header), file);
     TdProject_AddFile(file->filname);
-    return status;
-}
-
-// A file that holds nothing after its header gets the start block of an
-// (empty) static section before it is closed: a header is read up to the
-// block that follows it, so a header alone could not be read back. Only at
-// the end of the file: what follows the header is never written over.
-int32_t markEndOfHeader(HeaderHandle header, FileHandle file) {
-    if (file->ownerMark != kSectionHeader || file->error != F_NO_ERROR) return F_NO_ERROR;
-    const int64_t at = rcfTell64(file);
-    rcfSeek64(file, 0, 0, 2);
-    if (rcfTell64(file) != at) {
-        rcfSeek64(file, static_cast<uint32_t>(at), static_cast<uint32_t>(static_cast<uint64_t>(at) >> 32), 0);
-        return F_NO_ERROR;
-    }
-    const int32_t status = grdCheckWriteLB(header, kTagStaticStart, nullptr, file, kModule, __LINE__);
-    if (status == F_NO_ERROR) file->ownerMark = kSectionStatic;
     return status;
 }
 

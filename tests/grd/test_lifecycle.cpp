@@ -265,7 +265,7 @@ TEST_F(LifecycleTest, AppendStandsAtTheEndWithTheTimeStepCount) {
 
 // A file without dynamic data is appended to in the section it ends in: the
 // first time step written then begins the dynamic section itself. A file
-// closed with nothing after its header was given an empty static section.
+// closed with nothing after its header was given an empty dynamic section.
 TEST_F(LifecycleTest, AppendContinuesTheSectionTheFileEndsIn) {
     makeFileHeader();
     const std::string bare = dir_.file("bare.grd");
@@ -281,7 +281,7 @@ TEST_F(LifecycleTest, AppendContinuesTheSectionTheFileEndsIn) {
 
     if (header_ != nullptr) grdHeaderDestroy(&header_);
     ASSERT_EQ(grdFileAppend(bare.c_str(), &header_, &file_), 0);
-    EXPECT_EQ(file_->ownerMark, 2u);
+    EXPECT_EQ(file_->ownerMark, 3u);
     close();
     EXPECT_EQ(staticNames(bare), std::vector<std::string>{});
 

@@ -19,6 +19,7 @@
 #include "handles.h"
 #include "progress.h"
 #include "text.h"
+#include "tova/grd.h"
 #include "tova/rcf.h"
 
 namespace tova_cli {
@@ -232,7 +233,8 @@ std::optional<Problem> walk(FileHandle f, const RecordFileInfo& info, KindCheck*
                 const unsigned char typeByte = b.empty() ? 0 : b[0];
                 return Problem{pos, "the header of " + withArticle(recordHeaderName(typeByte)) + " needs " +
                                         std::to_string(headerLength(typeByte)) + " bytes, the file ends after " +
-                                        std::to_string(size - pos)};
+                                        std::to_string(size - pos),
+                               true};
             }
             if (error != F_NO_ERROR) return Problem{pos, "reading failed: status " + statusText(error)};
             return Problem{pos, "unknown record type byte 0x00"};
@@ -243,8 +245,10 @@ std::optional<Problem> walk(FileHandle f, const RecordFileInfo& info, KindCheck*
             if (count == 0) return Problem{pos, recordText(type, count) + ": a record holds at least one element"};
             const uint64_t bytes = 5 + static_cast<uint64_t>(rcfSimpSize(type)) * count;
             if (bytes > static_cast<uint64_t>(size - pos)) {
-                return Problem{pos, withArticle(recordText(type, count)) + " needs " + std::to_string(bytes) +
-                                        " bytes, only " + std::to_string(size - pos) + " remain in the file"};
+                return Problem{pos,
+                               withArticle(recordText(type, count)) + " needs " + std::to_string(bytes) +
+                                   " bytes, only " + std::to_string(size - pos) + " remain in the file",
+                               true};
             }
             ++counts.records;
         } else if (type == RCF_BLOCK) {
@@ -272,8 +276,10 @@ std::optional<Problem> walk(FileHandle f, const RecordFileInfo& info, KindCheck*
         }
     }
     if (inBlock) {
-        return Problem{open.offset, "block " + std::to_string(open.count) +
-                                        " has no terminator: the file ends at offset " + std::to_string(size)};
+        return Problem{open.offset,
+                       "block " + std::to_string(open.count) + " has no terminator: the file ends at offset " +
+                           std::to_string(size),
+                       true};
     }
     return std::nullopt;
 }
@@ -315,20 +321,50 @@ int runCheck(const CheckOptions& options) {
 
     std::unique_ptr<KindCheck> kind = kindCheck(info);
     Counts counts;
-    if (auto problem = walk(file.get(), info, kind.get(), counts)) return damaged(options.file, *problem);
+    std::optional<Problem> problem = walk(file.get(), info, kind.get(), counts);
     file.reset();
-    if (kind != nullptr) {
-        if (auto problem = kind->finish()) return damaged(options.file, *problem);
+    if (!problem && kind != nullptr) problem = kind->finish();
+
+    // A gridded file that ends inside a time step after complete ones was
+    // left so by a writer that was killed: readers never reach the
+    // unfinished step and the next append replaces it. The file is checked
+    // again up to the last complete step.
+    RecordFileInfo walked = info;
+    std::string tailWarning;
+    if (problem && problem->fileEnds && info.kind == FileKind::Grid) {
+        int32_t found = 0;
+        int32_t inHeader = 0;
+        int64_t tail = 0;
+        // Only a step the header does not count yet: a header that counts
+        // it describes data that are missing.
+        if (grdFileScan(options.file.c_str(), &found, &inHeader, &tail) == F_NO_ERROR && tail > 0 && found >= inHeader &&
+            static_cast<uint64_t>(tail) < info.size &&
+            problem->offset >= static_cast<int64_t>(info.size) - tail) {
+            walked.size -= static_cast<uint64_t>(tail);
+            tailWarning = "an unfinished time step (" + std::to_string(tail) + " bytes) follows the " +
+                          std::to_string(found) +
+                          " complete ones, as a writer leaves it that was killed: readers ignore it, the next "
+                          "append replaces it (repairable: run `tova repair " + options.file + "`)";
+            file = openRecordFile(options.file, &status);
+            if (status != F_NO_ERROR) throw Failure("cannot open " + options.file + " again: status " + statusText(status));
+            kind = kindCheck(walked);
+            counts = Counts{};
+            problem = walk(file.get(), walked, kind.get(), counts);
+            file.reset();
+            if (!problem && kind != nullptr) problem = kind->finish();
+        }
     }
+    if (problem) return damaged(options.file, *problem);
 
     std::string report;
     if (kind == nullptr) report += "note: unknown application: only the record structure was checked\n";
+    if (!tailWarning.empty()) report += "warning: " + tailWarning + "\n";
     if (kind != nullptr) {
         for (const std::string& warning : kind->warnings()) report += "warning: " + warning + "\n";
         for (const std::string& note : kind->notes()) report += "note: " + note + "\n";
     }
     report += "OK: " + std::to_string(counts.records) + " records in " + std::to_string(counts.blocks) + " blocks, " +
-              std::to_string(info.size) + " bytes\n";
+              std::to_string(walked.size) + " bytes\n";
     printOut(report);
     return kExitOk;
 }

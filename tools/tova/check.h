@@ -18,6 +18,7 @@ namespace tova_cli {
 struct Problem {
     int64_t offset = 0;
     std::string what;
+    bool fileEnds = false;  // the file ends inside a record, block or time step
 };
 
 // One record, block start or terminator met by the walk.

@@ -137,9 +137,10 @@ public:
         }
         if (section_ == Section::Dynamic) {
             if (strictSteps_ && next_ != 0) {
-                return Problem{end, "time step " + std::to_string(stepsSeen_ - 1) + " ends after " +
-                                        std::to_string(next_) + " of its " + std::to_string(items_.size()) +
-                                        " item records: the file is cut short"};
+                return Problem{end,
+                               "time step " + std::to_string(stepsSeen_ - 1) + " ends after " + std::to_string(next_) +
+                                   " of its " + std::to_string(items_.size()) + " item records: the file is cut short",
+                               true};
             }
             if (stepsSeen_ < headerSteps_) {
                 return Problem{end, "the header says " + std::to_string(headerSteps_) + " time steps, the data ends after " +
@@ -153,8 +154,8 @@ public:
             warnings_.push_back("the header says " + std::to_string(headerSteps_) + " time steps, the data holds " +
                              std::to_string(stepsSeen_) +
                              " complete ones: the header was not brought up to date after the last steps were "
-                             "written (the file can be repaired; readers see only " +
-                             std::to_string(headerSteps_) + ")");
+                             "written (readers see only " +
+                             std::to_string(headerSteps_) + "; repairable: run `tova repair " + info_.path + "`)");
         }
         if (section_ == Section::Dynamic && !strictSteps_) {
             notes_.push_back("file type " + std::to_string(fileType_) +

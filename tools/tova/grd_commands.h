@@ -48,6 +48,14 @@ int runDemo(const DemoOptions& options);
 // items, custom blocks.
 Value describeGrid(const RecordFileInfo& file);
 
+// `repair`: the header of a file whose writer was killed brought up to date
+// with the complete time steps on disk.
+struct RepairOptions {
+    std::string file;
+    bool dryRun = false;  // report only, change nothing
+};
+int runRepair(const RepairOptions& options);
+
 // Rules of gridded files for `check`, and a load through the data-file API.
 std::unique_ptr<KindCheck> gridCheck(const RecordFileInfo& file);
 

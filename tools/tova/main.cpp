@@ -104,6 +104,17 @@ int run(int argc, char** argv) {
     CheckOptions check;
     CLI::App* checkCmd = app.add_subcommand("check", "Structural check of a file; exit status 1 when it is damaged");
     checkCmd->add_option("FILE", check.file, "the file to check")->required();
+    checkCmd->footer(
+        "Exit status 0 for a sound file, also when warnings are printed: a gridded data file whose header counts "
+        "fewer time steps than it holds, or that ends with an unfinished time step (a writer that was killed), is "
+        "repairable with `tova repair FILE`; 1 when the file is damaged.");
+
+    RepairOptions repair;
+    CLI::App* repairCmd =
+        app.add_subcommand("repair", "Bring the header of a gridded data file up to date after a crashed run");
+    repairCmd->add_option("FILE", repair.file, "the gridded data file")->required();
+    repairCmd->add_flag("--dry-run", repair.dryRun, "report what would be repaired, change nothing");
+    repairCmd->footer("Exit status 0 when the file is consistent afterwards, 1 when it cannot be repaired.");
 
     UnitsOptions units;
     std::string unitsQuery;
@@ -120,7 +131,7 @@ int run(int argc, char** argv) {
     if (argc > 1 && argv[1][0] != '-' &&
         app.get_subcommands([&](CLI::App* sub) { return sub->get_name() == argv[1]; }).empty()) {
         std::fprintf(stderr,
-                     "tova: unknown subcommand \"%s\" (info, check, units, dump, stats, demo)\n"
+                     "tova: unknown subcommand \"%s\" (info, check, repair, units, dump, stats, demo)\n"
                      "Run with --help for more information.\n",
                      argv[1]);
         return kExitUsage;
@@ -136,6 +147,7 @@ int run(int argc, char** argv) {
 
     if (infoCmd->parsed()) return runInfo(info);
     if (checkCmd->parsed()) return runCheck(check);
+    if (repairCmd->parsed()) return runRepair(repair);
     if (unitsCmd->parsed()) {
         if (queryOpt->count() != 0) units.query = unitsQuery;
         return runUnits(units);

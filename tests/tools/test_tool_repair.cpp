@@ -1,0 +1,93 @@
+// `tova repair` and `tova check` on the files a crashed writer leaves: a
+// header that counts fewer time steps than the data holds and an unfinished
+// time step at the end are reported as repairable, repaired in place, and a
+// repaired file checks clean; files that cannot be repaired give status 1.
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "tool_test.h"
+
+using tooltest::runTova;
+
+namespace {
+
+bool has(const tooltest::Run& run, const std::string& text) { return run.out.find(text) != std::string::npos; }
+
+// A file whose header counts 2 time steps while 3 complete ones and half of
+// a fourth follow: the bytes of a 2-step file, then the third step and half
+// of it again, taken from a 3-step file of the same layout.
+std::vector<uint8_t> crashedFile(testutil::TempDir& dir) {
+    const std::string two = dir.file("two.grd");
+    const std::string three = dir.file("three.grd");
+    tooltest::writeGridFile(two, 2);
+    tooltest::writeGridFile(three, 3);
+    std::vector<uint8_t> bytes = testutil::readBytes(two);
+    const std::vector<uint8_t> more = testutil::readBytes(three);
+    const size_t step = more.size() - bytes.size();
+    const size_t begin = bytes.size();
+    bytes.insert(bytes.end(), more.begin() + static_cast<std::ptrdiff_t>(begin), more.end());
+    bytes.insert(bytes.end(), more.begin() + static_cast<std::ptrdiff_t>(begin),
+                 more.begin() + static_cast<std::ptrdiff_t>(begin + step / 2));
+    return bytes;
+}
+
+TEST(ToolRepair, CrashedFileIsRepairable) {
+    testutil::TempDir dir;
+    const std::string path = dir.file("run.grd");
+    const std::vector<uint8_t> crashed = crashedFile(dir);
+    testutil::writeBytes(path, crashed);
+
+    tooltest::Run run = runTova({"check", path});
+    EXPECT_EQ(run.exitCode, 0) << run.out;
+    EXPECT_TRUE(has(run, "warning: an unfinished time step (")) << run.out;
+    EXPECT_TRUE(has(run, "the header says 2 time steps, the data holds 3 complete ones")) << run.out;
+    EXPECT_TRUE(has(run, "repairable: run `tova repair " + path + "`")) << run.out;
+
+    run = runTova({"repair", path, "--dry-run"});
+    EXPECT_EQ(run.exitCode, 0) << run.out;
+    EXPECT_TRUE(has(run, path + ": header says 2 time steps, file holds 3 complete steps and a partial one")) << run.out;
+    EXPECT_TRUE(has(run, "; would repair\n")) << run.out;
+    EXPECT_EQ(testutil::readBytes(path), crashed);
+
+    run = runTova({"repair", path});
+    EXPECT_EQ(run.exitCode, 0) << run.out;
+    EXPECT_TRUE(has(run, "; repaired\n")) << run.out;
+    EXPECT_EQ(testutil::readBytes(path).size(), crashed.size());  // the unfinished step stays
+    EXPECT_TRUE(has(runTova({"info", path}), "timeSteps    3\n"));
+
+    const std::vector<uint8_t> repaired = testutil::readBytes(path);
+    run = runTova({"repair", path});
+    EXPECT_EQ(run.exitCode, 0) << run.out;
+    EXPECT_TRUE(has(run, "header says 3 time steps, file holds 3 complete steps and a partial one")) << run.out;
+    EXPECT_TRUE(has(run, "; nothing to repair\n")) << run.out;
+    EXPECT_EQ(testutil::readBytes(path), repaired);
+
+    run = runTova({"check", path});
+    EXPECT_EQ(run.exitCode, 0) << run.out;
+    EXPECT_TRUE(has(run, "warning: an unfinished time step (")) << run.out;
+    EXPECT_FALSE(has(run, "the header says")) << run.out;
+}
+
+TEST(ToolRepair, WhatCannotBeRepaired) {
+    testutil::TempDir dir;
+    const std::string vre = dir.file("a.vre");
+    tooltest::writeVreFile(vre);
+    tooltest::Run run = runTova({"repair", vre});
+    EXPECT_EQ(run.exitCode, 1);
+    EXPECT_TRUE(has(run, "not a gridded data file")) << run.out;
+
+    // Cut inside the header stream: damaged before any time step.
+    const std::string grid = dir.file("cut.grd");
+    tooltest::writeGridFile(grid, 2);
+    const std::vector<uint8_t> bytes = testutil::readBytes(grid);
+    const tooltest::Layout layout = tooltest::walkLayout(grid);
+    testutil::writeBytes(grid, std::vector<uint8_t>(bytes.begin(), bytes.begin() + layout.appBase + 40));
+    run = runTova({"repair", grid});
+    EXPECT_EQ(run.exitCode, 1) << run.out;
+    EXPECT_TRUE(has(run, "cannot be repaired")) << run.out;
+    EXPECT_TRUE(run.clean());
+}
+
+}  // namespace

@@ -70,6 +70,32 @@ TEST(ToolRepair, CrashedFileIsRepairable) {
     EXPECT_FALSE(has(run, "the header says")) << run.out;
 }
 
+// A file cut short inside a time step its header counts has lost data: it
+// is damaged, and check says what repair can keep; repair then makes it
+// consistent with its whole time steps.
+TEST(ToolRepair, FileCutInsideCountedStepIsDamagedButKeepsItsWholeSteps) {
+    testutil::TempDir dir;
+    const std::string path = dir.file("cut.grd");
+    tooltest::writeGridFile(path, 3);
+    const std::string two = dir.file("two.grd");
+    tooltest::writeGridFile(two, 2);
+    const size_t twoSteps = testutil::readBytes(two).size();
+    std::vector<uint8_t> bytes = testutil::readBytes(path);
+    bytes.resize(twoSteps + (bytes.size() - twoSteps) / 2);
+    testutil::writeBytes(path, bytes);
+
+    tooltest::Run run = runTova({"check", path});
+    EXPECT_EQ(run.exitCode, 1) << run.out;
+    EXPECT_TRUE(has(run, ": damaged at offset ")) << run.out;
+    EXPECT_TRUE(has(run, "note: the header counts 3 time steps, 2 are whole: `tova repair " + path + "`")) << run.out;
+
+    run = runTova({"repair", path});
+    EXPECT_EQ(run.exitCode, 0) << run.out;
+    EXPECT_TRUE(has(run, "header says 3 time steps, file holds 2 complete steps and a partial one")) << run.out;
+    EXPECT_TRUE(has(runTova({"info", path}), "timeSteps    2\n"));
+    EXPECT_EQ(runTova({"check", path}).exitCode, 0);
+}
+
 TEST(ToolRepair, WhatCannotBeRepaired) {
     testutil::TempDir dir;
     const std::string vre = dir.file("a.vre");

@@ -354,7 +354,20 @@ int runCheck(const CheckOptions& options) {
             if (!problem && kind != nullptr) problem = kind->finish();
         }
     }
-    if (problem) return damaged(options.file, *problem);
+    if (problem) {
+        const int result = damaged(options.file, *problem);
+        // Data lost at the end of a gridded file (a copy cut short, a disk
+        // that filled up): what is whole before it can still be kept.
+        int32_t found = 0;
+        int32_t inHeader = 0;
+        int64_t tail = 0;
+        if (info.kind == FileKind::Grid && grdFileScan(options.file.c_str(), &found, &inHeader, &tail) == F_NO_ERROR &&
+            found < inHeader) {
+            printOut("note: the header counts " + std::to_string(inHeader) + " time steps, " + std::to_string(found) +
+                     " are whole: `tova repair " + options.file + "` keeps those and makes the header count them\n");
+        }
+        return result;
+    }
 
     std::string report;
     if (kind == nullptr) report += "note: unknown application: only the record structure was checked\n";

@@ -391,7 +391,8 @@ TOVA_API int32_t TOVA_CALL grdFileAppend(const char* name, HeaderHandle* header,
 TOVA_API int32_t TOVA_CALL grdFileFlush(HeaderHandle header, FileHandle file);
 TOVA_API int32_t TOVA_CALL grdFileFlushTimeStep(HeaderHandle header, FileHandle file);
 /* Rewrites the header of a writable file, then closes it and nulls *file.
- * When the final header update fails the file stays open (retry possible). */
+ * When the final header update fails the file stays open (retry possible);
+ * a caller that gives up releases it with rcfFileClose(file). */
 TOVA_API int32_t TOVA_CALL grdFileClose(HeaderHandle header, FileHandle* file);
 TOVA_API int32_t TOVA_CALL grdFileDelete(const char* name);
 
@@ -414,7 +415,8 @@ TOVA_API int32_t TOVA_CALL grdFileScan(const char* name, int32_t* stepsFound, in
  * non-equidistant axis, its time span) disagrees with the complete time
  * steps, rewrites them in place. A consistent file is not modified. A
  * trailing unfinished time step stays on disk, uncounted; grdFileAppend
- * continues after the last complete time step. */
+ * continues after the last complete time step. 2010 when the header, read
+ * back after the update, still disagrees (a damaged header). */
 TOVA_API int32_t TOVA_CALL grdFileRecover(const char* name, int32_t* stepsFound, int32_t* stepsInHeader);
 
 /* ---- Static items ------------------------------------------------------------

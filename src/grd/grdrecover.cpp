@@ -201,7 +201,19 @@ int32_t scanFile(const char* name, int32_t* stepsFound, int32_t* stepsInHeader, 
     if (stepsFound != nullptr) *stepsFound = again.complete;
     status = grdUpdateHeaderTime(opened.header, 1, opened.file);
     const int32_t closed = FCloseFile(&opened.file);
-    return status != F_NO_ERROR ? status : closed;
+    if (status == F_NO_ERROR) status = closed;
+    if (status != F_NO_ERROR) return status;
+
+    // A damaged header may hold what the update cannot bring in line (a
+    // second time-axis block, say: the reader keeps the last, the update
+    // rewrites the first). Only a header that now agrees counts as repaired.
+    Opened check;
+    GrdStepWalk after;
+    status = openAndWalk(name, false, check, after);
+    if (status != F_NO_ERROR) return status;
+    if (grdApplyStepWalk(check.header, after))
+        return grdReportError(check.header, check.file, 0, F_ERR_VALUE, kModule, __LINE__);
+    return F_NO_ERROR;
 }
 
 }  // namespace

@@ -5,6 +5,7 @@
 // it in a record file, its reader and the in-place updates.
 #include "grd/grdheader.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 #include <initializer_list>
@@ -1546,7 +1547,13 @@ int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, const GrdApiTr
                 return true;
             });
         } else if (item != nullptr && tag == kTagElemStats) {
-            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode* old) {
+                // Only a stored block of the same size is replaced: building
+                // one of another size would be wasted (it is left as it is),
+                // and a damaged header could make it gigabytes large.
+                const int64_t used = std::max<int64_t>(grdItemUsedElementCount(item), 0);
+                if (old == nullptr || old->type != RCF_DOUBLE || static_cast<int64_t>(old->count) != 9 * used)
+                    return false;
                 fillStatsBlock(header, item, b);
                 return true;
             });

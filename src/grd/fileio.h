@@ -13,6 +13,21 @@
 uint32_t grdAppIdent(uint32_t* version);
 constexpr uint32_t kGrdAppVersion = 206;
 
+// Moves the file to an absolute position (clears an end-of-file state).
+inline void grdSeekTo(FileHandle file, int64_t offset) {
+    const auto u = static_cast<uint64_t>(offset);
+    rcfSeek64(file, static_cast<uint32_t>(u), static_cast<uint32_t>(u >> 32), 0);
+}
+
+// A record list read from the file, freed when it goes out of scope.
+struct GrdRecordList {
+    LrecNode* list = nullptr;
+    GrdRecordList() = default;
+    GrdRecordList(const GrdRecordList&) = delete;
+    GrdRecordList& operator=(const GrdRecordList&) = delete;
+    ~GrdRecordList() { rcfLrecListFree(&list); }
+};
+
 FileHandle FOpenFileCreate(const char* path, int32_t readBack);
 FileHandle FOpenFileRead(const char* path, int32_t* status);
 FileHandle FOpenFileEdit(const char* path, int32_t* status);
@@ -54,3 +69,23 @@ int32_t grdCheckWriteLR(HeaderHandle header, int32_t type, uint32_t count, const
 int32_t grdCheckSkipLR(HeaderHandle header, FileHandle file, const char* module, int32_t line);
 // Moves forward over a record of known type and count without reading it.
 int32_t grdCheckPseudoSkipLR(int32_t type, uint32_t count, FileHandle file);
+
+// A header and its file from an open, released at the end of scope unless
+// handed over to the caller.
+struct GrdOpenedFile {
+    HeaderHandle header = nullptr;
+    FileHandle file = nullptr;
+    GrdOpenedFile() = default;
+    GrdOpenedFile(const GrdOpenedFile&) = delete;
+    GrdOpenedFile& operator=(const GrdOpenedFile&) = delete;
+    ~GrdOpenedFile() {
+        if (header != nullptr) grdHeaderDestroy(&header);
+        if (file != nullptr) FCloseFile(&file);
+    }
+    void handOver(HeaderHandle* outHeader, FileHandle* outFile) {
+        *outHeader = header;
+        *outFile = file;
+        header = nullptr;
+        file = nullptr;
+    }
+};

@@ -19,12 +19,6 @@ inline constexpr uint32_t kSectionHeader = 1;
 inline constexpr uint32_t kSectionStatic = 2;
 inline constexpr uint32_t kSectionDynamic = 3;
 
-// Moves the file to an absolute position (clears an end-of-file state).
-inline void grdSeekTo(FileHandle file, int64_t offset) {
-    const auto u = static_cast<uint64_t>(offset);
-    rcfSeek64(file, static_cast<uint32_t>(u), static_cast<uint32_t>(u >> 32), 0);
-}
-
 // Whether the item's data are converted on read and write: a conversion mode
 // of 1-3 on a float or double item.
 bool grdItemDataConverts(const GrdItem* item) noexcept;

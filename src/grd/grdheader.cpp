@@ -551,10 +551,6 @@ int64_t coordValues(int32_t axisType, const int32_t* size, int32_t d) {
     return nodes;
 }
 
-void seekTo(FileHandle file, int64_t pos) {
-    rcfSeek64(file, static_cast<uint32_t>(pos), static_cast<uint32_t>(static_cast<uint64_t>(pos) >> 32), 0);
-}
-
 // Bytes from the logical position to the end of the file (0 when unknown);
 // the position is kept.
 int64_t remainingBytes(FileHandle file) {
@@ -562,7 +558,7 @@ int64_t remainingBytes(FileHandle file) {
     if (here < 0) return 0;
     rcfSeek64(file, 0, 0, 2);
     const int64_t end = rcfTell64(file);
-    seekTo(file, here);
+    grdSeekTo(file, here);
     return end > here ? end - here : 0;
 }
 
@@ -1445,7 +1441,7 @@ int32_t rewriteBlock(HeaderHandle header, FileHandle edit, int32_t tag, int64_t 
     OutBlock block(header, old.first());
     if (!fill(block, old.first()) || block.status() != F_NO_ERROR) return block.status();
     if (!block.sameShape(old.first())) return F_NO_ERROR;  // its size would change: left as it is
-    seekTo(edit, pos);
+    grdSeekTo(edit, pos);
     return block.write(static_cast<uint16_t>(tag), edit, __LINE__);
 }
 

@@ -37,11 +37,6 @@ int32_t report(HeaderHandle header, FileHandle file, int32_t code, int32_t line)
     return grdReportError(header, file, 0, code, kModule, line);
 }
 
-void seekTo(FileHandle file, int64_t offset) {
-    const auto u = static_cast<uint64_t>(offset);
-    rcfSeek64(file, static_cast<uint32_t>(u), static_cast<uint32_t>(u >> 32), 0);
-}
-
 // ---- Names -----------------------------------------------------------------------
 
 enum class PathKind { Missing, File, Directory };
@@ -86,22 +81,6 @@ bool resolveShortcut(std::string& name) {
 
 // ---- Opening -------------------------------------------------------------------
 
-// Releases what an open has made so far unless it is handed over.
-struct OpenResult {
-    HeaderHandle header = nullptr;
-    FileHandle file = nullptr;
-    ~OpenResult() {
-        if (header != nullptr) grdHeaderDestroy(&header);
-        if (file != nullptr) FCloseFile(&file);
-    }
-    void handOver(HeaderHandle* outHeader, FileHandle* outFile) {
-        *outHeader = header;
-        *outFile = file;
-        header = nullptr;
-        file = nullptr;
-    }
-};
-
 // Whether a static item can be an encoding key: 4-byte integers on an
 // equidistant one-dimensional axis.
 bool isKeyItem(const GrdStaticItem* item) {
@@ -131,8 +110,7 @@ int32_t loadEncodingKeys(HeaderHandle header, FileHandle file) {
         }
         grdStaticDestroy(&handle);
         if (!isKey) {
-            const auto at = static_cast<uint64_t>(before);
-            rcfSeek64(file, static_cast<uint32_t>(at), static_cast<uint32_t>(at >> 32), 0);
+            grdSeekTo(file, before);
             return rcfPeekError(file) > F_EOF ? report(header, file, F_ERR_SEEK, __LINE__) : F_NO_ERROR;
         }
         if (!key) return report(header, file, F_ERR_MEMORY, __LINE__);
@@ -157,7 +135,7 @@ void restoreLargestTime(HeaderHandle header) {
 
 // Opens name for reading or editing, reads its header and, for a compressed
 // file, its encoding keys.
-int32_t openAndReadHeader(const char* name, bool edit, OpenResult& out) {
+int32_t openAndReadHeader(const char* name, bool edit, GrdOpenedFile& out) {
     int32_t status = F_NO_ERROR;
     out.file = edit ? FOpenFileEdit(name, &status) : FOpenFileRead(name, &status);
     if (out.file == nullptr) return status;
@@ -200,7 +178,7 @@ int32_t sectionAtEnd(FileHandle file, uint32_t* section) {
 // Cuts the file at offset: what follows is an unfinished time step that the
 // data written next must replace, not leave behind.
 bool truncateAt(FileHandle file, int64_t offset) {
-    seekTo(file, offset);
+    grdSeekTo(file, offset);
     if (std::fflush(file->stream) != 0) return false;
 #ifdef _WIN32
     if (_chsize_s(_fileno(file->stream), offset) != 0) return false;
@@ -221,7 +199,7 @@ int32_t appendAfterLastStep(HeaderHandle header, FileHandle file) {
     const int32_t status = grdWalkTimeSteps(header, file, &walk);
     if (status != F_NO_ERROR) return status;
     if (walk.partial() && !truncateAt(file, walk.end)) return report(header, file, F_ERR_WRITE, __LINE__);
-    seekTo(file, walk.end);
+    grdSeekTo(file, walk.end);
     file->ownerMark = walk.section;
     grdApplyStepWalk(header, walk);
     return F_NO_ERROR;
@@ -317,7 +295,7 @@ int32_t readFile(const char* name, HeaderHandle* outHeader, FileHandle* outFile)
     if (outs != F_NO_ERROR) return outs;
     // Files of the legacy family would go to the legacy translator; none ships.
     if (isLegacyName(path.c_str())) return report(nullptr, nullptr, F_ERR_VALUE, __LINE__);
-    OpenResult opened;
+    GrdOpenedFile opened;
     const int32_t status = openAndReadHeader(path.c_str(), false, opened);
     if (status == F_NO_ERROR) opened.handOver(outHeader, outFile);
     return status;
@@ -326,7 +304,7 @@ int32_t readFile(const char* name, HeaderHandle* outHeader, FileHandle* outFile)
 int32_t editFile(const char* name, HeaderHandle* outHeader, FileHandle* outFile) {
     const int32_t outs = clearOuts(outHeader, outFile);
     if (outs != F_NO_ERROR) return outs;
-    OpenResult opened;
+    GrdOpenedFile opened;
     const int32_t status = openAndReadHeader(name, true, opened);
     if (status == F_NO_ERROR) opened.handOver(outHeader, outFile);
     return status;
@@ -335,7 +313,7 @@ int32_t editFile(const char* name, HeaderHandle* outHeader, FileHandle* outFile)
 int32_t appendFile(const char* name, HeaderHandle* outHeader, FileHandle* outFile, const GrdApiTrace& trace) {
     int32_t status = clearOuts(outHeader, outFile);
     if (status != F_NO_ERROR) return status;
-    OpenResult opened;
+    GrdOpenedFile opened;
     status = openAndReadHeader(name, true, opened);
     if (opened.file == nullptr) {
         trace.print("F_ERR_OPEN");
@@ -388,7 +366,7 @@ int32_t markEndOfHeader(HeaderHandle header, FileHandle file) {
         const int32_t status = grdCheckWriteLB(header, kTagDynamicStart, nullptr, file, kModule, __LINE__);
         if (status != F_NO_ERROR) return status;
     }
-    seekTo(file, at);
+    grdSeekTo(file, at);
     return F_NO_ERROR;
 }
 

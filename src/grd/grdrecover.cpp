@@ -25,11 +25,6 @@ namespace {
 
 constexpr const char* kModule = "..\\grd\\grdopen";
 
-void seekTo(FileHandle file, int64_t offset) {
-    const auto u = static_cast<uint64_t>(offset);
-    rcfSeek64(file, static_cast<uint32_t>(u), static_cast<uint32_t>(u >> 32), 0);
-}
-
 bool timeInBlock(int32_t fileType) { return fileType == F_NEQTIME_FIXEDSPACE_ALLITEMS; }
 
 // Passes over the logical block at the position, mark to terminator; false
@@ -47,18 +42,12 @@ bool skipBlock(FileHandle file, uint32_t* identifier) {
     }
 }
 
-// Frees a record list when it goes out of scope.
-struct ListGuard {
-    LrecNode* list = nullptr;
-    ~ListGuard() { rcfLrecListFree(&list); }
-};
-
 // Reads the block that opens a time step: a 50001 block, empty or holding
 // the time as one double by the file type.
 bool readStepBlock(const GrdHeader* header, FileHandle file, double* time) {
     uint32_t identifier = 0;
     if (rcfQuery(file, &identifier) != RCF_BLOCK || identifier != kTagTimeStep) return false;
-    ListGuard block;
+    GrdRecordList block;
     uint32_t nodes = 0;
     rcfBlockRead(file, &nodes, &block.list);
     if (rcfPeekError(file) != F_NO_ERROR) return false;
@@ -108,7 +97,7 @@ int32_t grdWalkTimeSteps(HeaderHandle header, FileHandle file, GrdStepWalk* walk
         if (type == 0 && walk->end == walk->length) break;  // the file ends before any data
         if (!skipBlock(file, &identifier)) {
             rcfGetError(file);
-            seekTo(file, walk->end);
+            grdSeekTo(file, walk->end);
             return grdReportError(header, file, 0, F_ERR_NOT_BLOCK, kModule, __LINE__);
         }
         if (identifier == kTagStaticStart) walk->section = kSectionStatic;
@@ -126,7 +115,7 @@ int32_t grdWalkTimeSteps(HeaderHandle header, FileHandle file, GrdStepWalk* walk
         }
     }
     rcfGetError(file);  // the end of the walk is no failure
-    seekTo(file, walk->end);
+    grdSeekTo(file, walk->end);
     return F_NO_ERROR;
 }
 
@@ -151,18 +140,8 @@ bool grdApplyStepWalk(GrdHeader* header, const GrdStepWalk& walk) {
 
 namespace {
 
-// A header and its file, opened by name and released at the end of scope.
-struct Opened {
-    HeaderHandle header = nullptr;
-    FileHandle file = nullptr;
-    ~Opened() {
-        if (file != nullptr) FCloseFile(&file);
-        if (header != nullptr) grdHeaderDestroy(&header);
-    }
-};
-
 // Opens name, checks that its time steps can be walked and walks them.
-int32_t openAndWalk(const char* name, bool edit, Opened& opened, GrdStepWalk& walk) {
+int32_t openAndWalk(const char* name, bool edit, GrdOpenedFile& opened, GrdStepWalk& walk) {
     int32_t status = edit ? grdFileEdit(name, &opened.header, &opened.file)
                           : grdFileRead(name, &opened.header, &opened.file);
     if (status != F_NO_ERROR) return status;
@@ -183,7 +162,7 @@ int32_t scanFile(const char* name, int32_t* stepsFound, int32_t* stepsInHeader, 
     GrdStepWalk walk;
     bool agrees = true;
     {
-        Opened opened;
+        GrdOpenedFile opened;
         const int32_t status = openAndWalk(name, false, opened, walk);
         if (status != F_NO_ERROR) return status;
         if (stepsInHeader != nullptr) *stepsInHeader = grdTimeAxisValues(opened.header)->timeSteps;
@@ -193,7 +172,7 @@ int32_t scanFile(const char* name, int32_t* stepsFound, int32_t* stepsInHeader, 
     if (tailBytes != nullptr) *tailBytes = walk.length - walk.end;
     if (!repair || agrees) return F_NO_ERROR;
 
-    Opened opened;
+    GrdOpenedFile opened;
     GrdStepWalk again;
     int32_t status = openAndWalk(name, true, opened, again);
     if (status != F_NO_ERROR) return status;
@@ -207,7 +186,7 @@ int32_t scanFile(const char* name, int32_t* stepsFound, int32_t* stepsInHeader, 
     // A damaged header may hold what the update cannot bring in line (a
     // second time-axis block, say: the reader keeps the last, the update
     // rewrites the first). Only a header that now agrees counts as repaired.
-    Opened check;
+    GrdOpenedFile check;
     GrdStepWalk after;
     status = openAndWalk(name, false, check, after);
     if (status != F_NO_ERROR) return status;

@@ -122,19 +122,13 @@ int32_t writeTimeStepBlock(GrdHeader* header, FileHandle file, double time) {
     return report(header, file, F_ERR_DATA_TYPE, __LINE__);
 }
 
-// Frees a record list read from the file when it goes out of scope.
-struct ListGuard {
-    LrecNode* list = nullptr;
-    ~ListGuard() { rcfLrecListFree(&list); }
-};
-
 // Reads the block that opens a time step and makes its time the header's
 // current time: the stored time for the non-equidistant file types, else the
 // index of the time step. With the modify-times switch on, times of a
 // non-equidistant axis are given relative to its start.
 int32_t readTimeStepBlock(GrdHeader* header, FileHandle file) {
     header->currentTime = header->deleteValDouble;
-    ListGuard block;
+    GrdRecordList block;
     uint16_t identifier = 0;
     const int32_t status = grdCheckReadLB(header, file, &block.list, &identifier, kModule, __LINE__);
     if (status != F_NO_ERROR) return status;

@@ -105,6 +105,15 @@ void appendSteps(const std::string& path, int32_t more) {
 
 class RecoverTest : public GrdTest {
 protected:
+    // Copies the open file as a crash leaves it (what reached the stream),
+    // then drops the writer without the close's header update.
+    static void abandon(const std::string& path, const std::string& crashed, HeaderHandle* h, FileHandle* f) {
+        ASSERT_EQ(std::fflush((*f)->stream), 0);
+        fs::copy_file(path, crashed, fs::copy_options::overwrite_existing);
+        rcfFileClose(f);
+        grdHeaderDestroy(h);
+    }
+
     testutil::TempDir dir_;
 };
 
@@ -127,10 +136,7 @@ TEST_F(RecoverTest, HeaderBehindItsDataIsBroughtUpToDate) {
             ASSERT_EQ(grdFileFlush(h, f), 0);
         }
         ASSERT_EQ(writeStep(h, f, 7, 1), 0);  // half a time step
-        ASSERT_EQ(std::fflush(f->stream), 0);
-        fs::copy_file(path, crashed, fs::copy_options::overwrite_existing);
-        rcfFileClose(&f);
-        grdHeaderDestroy(&h);
+        abandon(path, crashed, &h, &f);
 
         int32_t found = -1, inHeader = -1;
         int64_t tail = -1;
@@ -168,10 +174,7 @@ TEST_F(RecoverTest, AppendWithoutRecoveryContinuesAfterTheCompleteSteps) {
     FileHandle f = nullptr;
     createFile(path, F_NEQTIME_FIXEDSPACE_ALLITEMS, &h, &f);
     for (int32_t t = 0; t < 4; ++t) ASSERT_EQ(writeStep(h, f, t), 0);
-    ASSERT_EQ(std::fflush(f->stream), 0);
-    fs::copy_file(path, crashed);
-    rcfFileClose(&f);
-    grdHeaderDestroy(&h);
+    abandon(path, crashed, &h, &f);
 
     appendSteps(crashed, 3);
     expectSteps(crashed, 7);

@@ -331,38 +331,34 @@ int runCheck(const CheckOptions& options) {
     // again up to the last complete step.
     RecordFileInfo walked = info;
     std::string tailWarning;
-    if (problem && problem->fileEnds && info.kind == FileKind::Grid) {
-        int32_t found = 0;
-        int32_t inHeader = 0;
-        int64_t tail = 0;
-        // Only a step the header does not count yet: a header that counts
-        // it describes data that are missing.
-        if (grdFileScan(options.file.c_str(), &found, &inHeader, &tail) == F_NO_ERROR && tail > 0 && found >= inHeader &&
-            static_cast<uint64_t>(tail) < info.size &&
-            problem->offset >= static_cast<int64_t>(info.size) - tail) {
-            walked.size -= static_cast<uint64_t>(tail);
-            tailWarning = "an unfinished time step (" + std::to_string(tail) + " bytes) follows the " +
-                          std::to_string(found) +
-                          " complete ones, as a writer leaves it that was killed: readers ignore it, the next "
-                          "append replaces it (repairable: run `tova repair " + options.file + "`)";
-            file = openRecordFile(options.file, &status);
-            if (status != F_NO_ERROR) throw Failure("cannot open " + options.file + " again: status " + statusText(status));
-            kind = kindCheck(walked);
-            counts = Counts{};
-            problem = walk(file.get(), walked, kind.get(), counts);
-            file.reset();
-            if (!problem && kind != nullptr) problem = kind->finish();
-        }
+    // The complete time steps of a damaged gridded file (scanned once).
+    int32_t found = 0;
+    int32_t inHeader = 0;
+    int64_t tail = 0;
+    const bool scanned = problem && info.kind == FileKind::Grid &&
+                         grdFileScan(options.file.c_str(), &found, &inHeader, &tail) == F_NO_ERROR;
+    // Only a step the header does not count yet: a header that counts it
+    // describes data that are missing.
+    if (scanned && problem->fileEnds && tail > 0 && found >= inHeader && static_cast<uint64_t>(tail) < info.size &&
+        problem->offset >= static_cast<int64_t>(info.size) - tail) {
+        walked.size -= static_cast<uint64_t>(tail);
+        tailWarning = "an unfinished time step (" + std::to_string(tail) + " bytes) follows the " +
+                      std::to_string(found) +
+                      " complete ones, as a writer leaves it that was killed: readers ignore it, the next "
+                      "append replaces it (repairable: run `tova repair " + options.file + "`)";
+        file = openRecordFile(options.file, &status);
+        if (status != F_NO_ERROR) throw Failure("cannot open " + options.file + " again: status " + statusText(status));
+        kind = kindCheck(walked);
+        counts = Counts{};
+        problem = walk(file.get(), walked, kind.get(), counts);
+        file.reset();
+        if (!problem && kind != nullptr) problem = kind->finish();
     }
     if (problem) {
         const int result = damaged(options.file, *problem);
         // Data lost at the end of a gridded file (a copy cut short, a disk
         // that filled up): what is whole before it can still be kept.
-        int32_t found = 0;
-        int32_t inHeader = 0;
-        int64_t tail = 0;
-        if (info.kind == FileKind::Grid && grdFileScan(options.file.c_str(), &found, &inHeader, &tail) == F_NO_ERROR &&
-            found < inHeader) {
+        if (scanned && found < inHeader) {
             printOut("note: the header counts " + std::to_string(inHeader) + " time steps, " + std::to_string(found) +
                      " are whole: `tova repair " + options.file + "` keeps those and makes the header count them\n");
         }

@@ -141,61 +141,6 @@ void grdItemReset(GrdItem* item) noexcept {
     setReferences(item, F_DELETE_VALUE_FLOAT);
 }
 
-namespace {
-
-// Product of non-negative factors, saturated at INT64_MAX.
-int64_t product(std::initializer_list<int64_t> factors) noexcept {
-    int64_t p = 1;
-    for (int64_t f : factors) {
-        if (f != 0 && p > std::numeric_limits<int64_t>::max() / f) return std::numeric_limits<int64_t>::max();
-        p *= f;
-    }
-    return p;
-}
-
-}  // namespace
-
-int64_t grdItemFullElements(const GrdItem* item) noexcept {
-    const int64_t x = item->size[0], y = item->size[1], z = item->size[2], t = item->size[3];
-    switch (item->axisType) {
-        case F_EQ_AXIS_D0:
-            return 1;
-        case F_EQ_AXIS_D1:
-        case F_NEQ_AXIS_D1:
-        case F_TVAR_AXIS_D1:
-            return x < 0 ? -1 : x;
-        case F_EQ_AXIS_D2:
-        case F_NEQ_AXIS_D2:
-        case F_TVAR_AXIS_D2:
-        case F_CURVE_LINEAR_AXIS_D2:
-            return (x < 0 || y < 0) ? -1 : product({x, y});
-        case F_EQ_AXIS_D3:
-        case F_NEQ_AXIS_D3:
-        case F_TVAR_AXIS_D3:
-        case F_CURVE_LINEAR_AXIS_D3:
-            return (x < 0 || y < 0 || z < 0) ? -1 : product({x, y, z});
-        case F_EQ_AXIS_D4:
-            return (x < 0 || y < 0 || z < 0 || t < 0) ? -1 : product({x, y, z, t});
-        default:
-            return -1;
-    }
-}
-
-namespace {
-
-int64_t cappedByKey(const GrdItem* item, bool requireEnabled) noexcept {
-    const int64_t full = grdItemFullElements(item);
-    const GrdHeader* h = item->owner;
-    if (full < 0 || h == nullptr || item->isStatic || !h->fileCompressed) return full;
-    if (requireEnabled && !h->itemCompressionEnabled) return full;
-    return full < h->keyLength ? full : h->keyLength;
-}
-
-}  // namespace
-
-int64_t grdItemElementCount(const GrdItem* item) noexcept { return cappedByKey(item, true); }
-int64_t grdItemUsedElementCount(const GrdItem* item) noexcept { return cappedByKey(item, false); }
-
 int32_t grdSimpleTypeSize(int32_t simpleType) noexcept {
     switch (simpleType) {
         case RCF_FLOAT:

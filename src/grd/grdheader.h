@@ -175,9 +175,11 @@ int32_t grdItemInitStatistics(GrdHeader* header, GrdItem* item, const char* modu
 
 // Element counts in 64 bits, never reported: -1 when the axis kind has none
 // (undefined or unknown axis type) or a size is negative.
-int64_t grdItemFullElements(const GrdItem* item) noexcept;   // the XYZ size
-int64_t grdItemElementCount(const GrdItem* item) noexcept;   // grdGetItemElements
-int64_t grdItemUsedElementCount(const GrdItem* item) noexcept;  // grdGetUsedItemElements
+// They are inline (after GrdHeader below): every write and read of a time
+// step asks for them.
+inline int64_t grdItemFullElements(const GrdItem* item) noexcept;      // the XYZ size
+inline int64_t grdItemElementCount(const GrdItem* item) noexcept;      // grdGetItemElements
+inline int64_t grdItemUsedElementCount(const GrdItem* item) noexcept;  // grdGetUsedItemElements
 // Values held by coordinate array d (0-2) of the item's axis: size + 1
 // boundaries (non-equidistant), one per node (curvilinear), else 0.
 int64_t grdItemCoordinateCount(const GrdItem* item, int32_t d) noexcept;
@@ -304,6 +306,54 @@ struct GrdHeader {
     GrdHeader& operator=(const GrdHeader&) = delete;
     ~GrdHeader();  // releases the extension and legacy states, then the rest
 };
+
+namespace grd_detail {
+
+// Product of non-negative factors, saturated at INT64_MAX.
+inline int64_t saturatedProduct(int64_t a, int64_t b) noexcept {
+    return (b != 0 && a > INT64_MAX / b) ? INT64_MAX : a * b;
+}
+
+inline int64_t cappedByKey(const GrdItem* item, bool requireEnabled) noexcept {
+    const int64_t full = grdItemFullElements(item);
+    const GrdHeader* h = item->owner;
+    if (full < 0 || h == nullptr || item->isStatic || !h->fileCompressed) return full;
+    if (requireEnabled && !h->itemCompressionEnabled) return full;
+    return full < h->keyLength ? full : h->keyLength;
+}
+
+}  // namespace grd_detail
+
+inline int64_t grdItemFullElements(const GrdItem* item) noexcept {
+    using grd_detail::saturatedProduct;
+    const int64_t x = item->size[0], y = item->size[1], z = item->size[2], t = item->size[3];
+    switch (item->axisType) {
+        case F_EQ_AXIS_D0:
+            return 1;
+        case F_EQ_AXIS_D1:
+        case F_NEQ_AXIS_D1:
+        case F_TVAR_AXIS_D1:
+            return x < 0 ? -1 : x;
+        case F_EQ_AXIS_D2:
+        case F_NEQ_AXIS_D2:
+        case F_TVAR_AXIS_D2:
+        case F_CURVE_LINEAR_AXIS_D2:
+            return (x < 0 || y < 0) ? -1 : saturatedProduct(x, y);
+        case F_EQ_AXIS_D3:
+        case F_NEQ_AXIS_D3:
+        case F_TVAR_AXIS_D3:
+        case F_CURVE_LINEAR_AXIS_D3:
+            return (x < 0 || y < 0 || z < 0) ? -1 : saturatedProduct(saturatedProduct(x, y), z);
+        case F_EQ_AXIS_D4:
+            return (x < 0 || y < 0 || z < 0 || t < 0) ? -1
+                                                      : saturatedProduct(saturatedProduct(saturatedProduct(x, y), z), t);
+        default:
+            return -1;
+    }
+}
+
+inline int64_t grdItemElementCount(const GrdItem* item) noexcept { return grd_detail::cappedByKey(item, true); }
+inline int64_t grdItemUsedElementCount(const GrdItem* item) noexcept { return grd_detail::cappedByKey(item, false); }
 
 // A new header with the defaults of a header about to be filled (titles
 // empty, default delete values, no items); null when memory fails.

@@ -22,6 +22,22 @@ constexpr const char* kModule = kModGrdItemStats;
 // The global pass of one data type.
 template <class T>
 GrdExtremes scanGlobal(const T* p, int64_t n, T del, bool hasDelete) {
+    // A few values (a scalar or short item, written once per call) are not
+    // worth the set-up of a vector scan.
+    if (n < 8) {
+        GrdExtremes e{std::numeric_limits<double>::infinity(), -std::numeric_limits<double>::infinity(), 0, 0};
+        for (int64_t i = 0; i < n; ++i) {
+            if (hasDelete && p[i] == del) {
+                ++e.deletes;
+                continue;
+            }
+            const double x = static_cast<double>(p[i]);
+            e.min = x < e.min ? x : e.min;
+            e.max = x > e.max ? x : e.max;
+        }
+        e.values = n - e.deletes;
+        return e;
+    }
     if constexpr (std::is_same_v<T, float> || std::is_same_v<T, double>) {
         return grdScanExtremes(p, n, del);
     } else {

@@ -81,8 +81,11 @@ int32_t checkCursor(HeaderHandle header, FileHandle file, int32_t mask, Cursor& 
     if (c.size == 0) return report(header, file, F_ERR_DATA_TYPE, line);
     // One record holds at most 2^32 - 1 bytes (a time-varying item also its
     // three float coordinates per element).
-    const int64_t limit = static_cast<int64_t>(UINT32_MAX) / (spaceVaries(header->fileType) ? 12 : c.size);
-    if (c.elements > limit || c.used > limit) return report(header, file, F_ERR_VALUE, line);
+    // (A product, not a division: this runs on every call.)
+    const uint64_t perElement = spaceVaries(header->fileType) ? 12 : c.size;
+    const int64_t larger = c.elements > c.used ? c.elements : c.used;
+    if (larger > static_cast<int64_t>(UINT32_MAX) || static_cast<uint64_t>(larger) * perElement > UINT32_MAX)
+        return report(header, file, F_ERR_VALUE, line);
     return F_NO_ERROR;
 }
 

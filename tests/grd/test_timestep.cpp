@@ -415,6 +415,19 @@ TEST_F(TimeStep, CursorChecksRefuseWithoutMovingTheCursor) {
     ASSERT_EQ(grdWriteItemTimeStep(header_, file_, 0.0, v), 0);
     header_->items[1].axisType = F_UNDEFINED_AXIS;  // no elements
     EXPECT_EQ(grdWriteItemTimeStep(header_, file_, 0.0, v), 2010);
+    // One record holds at most 2^32 - 1 bytes: 2^30 floats (2^32 bytes) and
+    // 2^32 bytes are refused before the (two-value) array is touched.
+    header_->items[1].axisType = F_EQ_AXIS_D2;
+    header_->items[1].size[0] = 32768;
+    header_->items[1].size[1] = 32768;
+    EXPECT_EQ(grdWriteItemTimeStep(header_, file_, 0.0, v), 2010);
+    header_->items[1].dataType = RCF_BYTE;
+    header_->items[1].size[0] = 65536;
+    header_->items[1].size[1] = 65536;
+    EXPECT_EQ(grdWriteItemTimeStep(header_, file_, 0.0, v), 2010);
+    header_->items[1].dataType = RCF_FLOAT;
+    header_->items[1].size[0] = 2;
+    header_->items[1].size[1] = 0;
     header_->items[1].axisType = F_EQ_AXIS_D1;
     EXPECT_EQ(header_->nextItem, 1);
     header_->nextItem = 5;
@@ -430,7 +443,7 @@ TEST_F(TimeStep, CursorChecksRefuseWithoutMovingTheCursor) {
     header_->fileType = F_EQTIME_FIXEDSPACE_ALLITEMS;
     EXPECT_EQ(header_->nextItem, 1);
     EXPECT_EQ(header_->timeStepsDone, 0);
-    EXPECT_EQ(takeCodes(), (Codes{1000, 1000, 1000, 2010, 2007, 2007, 2018, 2018, 2018, 2018}));
+    EXPECT_EQ(takeCodes(), (Codes{1000, 1000, 1000, 2010, 2010, 2010, 2007, 2007, 2018, 2018, 2018, 2018}));
     ASSERT_EQ(grdWriteItemTimeStep(header_, file_, 0.0, v), 0);
     EXPECT_EQ(header_->timeStepsDone, 1);
 

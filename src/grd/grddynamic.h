@@ -5,7 +5,9 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 
+#include "grd/grdextremes.h"
 #include "grd/grdheader.h"
 #include "rcf/rcf_internal.h"
 #include "tova/grd.h"
@@ -35,4 +37,13 @@ double grdConvertItemValue(const GrdHeader* header, const GrdItem* item, double 
 // written (converted into the item's unit, gathered when compressed).
 // Traced "grdCalcStatistics %d"; 2010 for an unknown statistics type (the
 // global extremes are kept all the same).
-int32_t grdCalcStatistics(GrdHeader* header, int32_t itemNo, const void* values);
+// started, when not null, is the extremes pass over the same values begun by
+// grdStartGlobalStatistics.
+int32_t grdCalcStatistics(GrdHeader* header, int32_t itemNo, const void* values,
+                          GrdExtremesBeside* started = nullptr);
+// Begins the statistics' extremes pass over the n values of item about to be
+// written, beside the write (see GrdExtremesBeside), when the header keeps
+// global statistics only and the values are many floats or doubles; else
+// leaves pass empty and grdCalcStatistics does all the work.
+void grdStartGlobalStatistics(const GrdHeader* header, const GrdItem* item, const void* values, int64_t n,
+                              std::optional<GrdExtremesBeside>& pass);

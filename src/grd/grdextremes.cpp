@@ -6,7 +6,16 @@
 // counts as a value and never becomes an extreme.
 #include "grd/grdextremes.h"
 
+#include <cstdlib>
 #include <type_traits>
+
+#if defined(__unix__) || defined(__APPLE__)
+#include <pthread.h>
+#include <signal.h>
+#endif
+#if defined(__linux__)
+#include <sched.h>
+#endif
 
 #if defined(__x86_64__) && (defined(__GNUC__) || defined(__clang__))
 #define TOVA_EXTREMES_X86 1
@@ -186,3 +195,82 @@ GrdExtremes scan(const T* p, int64_t n, T del) {
 
 GrdExtremes grdScanExtremes(const float* p, int64_t n, float del) noexcept { return scan(p, n, del); }
 GrdExtremes grdScanExtremes(const double* p, int64_t n, double del) noexcept { return scan(p, n, del); }
+
+// ---- The scan beside the write --------------------------------------------------------------
+
+namespace {
+
+// Below this size a thread's start (tens of microseconds) costs about what
+// the scan would.
+constexpr int64_t kBesideBytes = int64_t{1} << 20;
+
+// Processors this process may run on: a process bound to one (a rank of a
+// parallel model pinned to its core) would only share it with the helper.
+unsigned usableProcessors() noexcept {
+#if defined(__linux__)
+    cpu_set_t set;
+    CPU_ZERO(&set);
+    if (sched_getaffinity(0, sizeof set, &set) == 0) return static_cast<unsigned>(CPU_COUNT(&set));
+#endif
+    return std::thread::hardware_concurrency();
+}
+
+bool besideAllowed() noexcept {
+    static const bool allowed = std::getenv("TOVA_NO_THREADS") == nullptr && usableProcessors() > 1;
+    return allowed;
+}
+
+}  // namespace
+
+bool GrdExtremesBeside::worthwhile(int64_t bytes) noexcept { return bytes >= kBesideBytes && besideAllowed(); }
+
+GrdExtremesBeside::GrdExtremesBeside(const float* p, int64_t n, float del) noexcept
+    : p_(p), n_(n), del_(del), isFloat_(true) {
+    start();
+}
+
+GrdExtremesBeside::GrdExtremesBeside(const double* p, int64_t n, double del) noexcept
+    : p_(p), n_(n), del_(del), isFloat_(false) {
+    start();
+}
+
+GrdExtremesBeside::~GrdExtremesBeside() {
+    if (thread_.joinable()) thread_.join();
+}
+
+void GrdExtremesBeside::run() noexcept {
+    out_ = isFloat_ ? grdScanExtremes(static_cast<const float*>(p_), n_, static_cast<float>(del_))
+                    : grdScanExtremes(static_cast<const double*>(p_), n_, del_);
+}
+
+void GrdExtremesBeside::start() noexcept {
+    if (!worthwhile(n_ * (isFloat_ ? 4 : 8))) return;
+#if defined(__unix__) || defined(__APPLE__)
+    // Signals meant for the process stay with the caller's threads: the
+    // helper starts with all of them blocked and keeps that mask.
+    sigset_t all;
+    sigset_t previous;
+    sigfillset(&all);
+    const bool masked = pthread_sigmask(SIG_SETMASK, &all, &previous) == 0;
+#endif
+    try {
+        thread_ = std::thread([this] { run(); });
+        ranBeside_ = true;
+    } catch (...) {
+        // No thread (resources or memory): result() scans here.
+    }
+#if defined(__unix__) || defined(__APPLE__)
+    if (masked) pthread_sigmask(SIG_SETMASK, &previous, nullptr);
+#endif
+}
+
+GrdExtremes GrdExtremesBeside::result() noexcept {
+    if (done_) return out_;
+    if (thread_.joinable()) {
+        thread_.join();
+    } else {
+        run();
+    }
+    done_ = true;
+    return out_;
+}

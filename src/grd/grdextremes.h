@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <limits>
+#include <thread>
 
 // Extremes over the values that are not the delete value, and the counts.
 // With no ordinary value min is +inf (or the type's maximum) and max -inf.
@@ -61,3 +62,39 @@ GrdExtremes grdScanExtremesScalar(const T* p, int64_t n, T del, bool hasDelete) 
 // The same for float and double arrays, on the widest vector unit present.
 GrdExtremes grdScanExtremes(const float* p, int64_t n, float del) noexcept;
 GrdExtremes grdScanExtremes(const double* p, int64_t n, double del) noexcept;
+
+// The scan of a large float or double array run on a second thread, beside
+// the caller writing the same values to the file, so that the pass costs
+// (almost) no time where the process may use a second processor: started by
+// the constructor, waited for by result() (or the destructor). It runs on the
+// caller's thread instead, inside result(), when the process is bound to one
+// processor, the environment sets TOVA_NO_THREADS, or the thread cannot be
+// started. The helper thread blocks every signal. The array must not change
+// until result() returned.
+class GrdExtremesBeside {
+public:
+    GrdExtremesBeside(const float* p, int64_t n, float del) noexcept;
+    GrdExtremesBeside(const double* p, int64_t n, double del) noexcept;
+    ~GrdExtremesBeside();
+    GrdExtremesBeside(const GrdExtremesBeside&) = delete;
+    GrdExtremesBeside& operator=(const GrdExtremesBeside&) = delete;
+
+    GrdExtremes result() noexcept;
+    // Whether a scan of this many bytes is worth a thread of its own here.
+    static bool worthwhile(int64_t bytes) noexcept;
+    // Whether the scan was started on a thread of its own.
+    bool onOwnThread() const noexcept { return ranBeside_; }
+
+private:
+    void start() noexcept;
+    void run() noexcept;
+
+    const void* p_;
+    int64_t n_;
+    double del_;
+    bool isFloat_;
+    bool done_ = false;
+    bool ranBeside_ = false;
+    GrdExtremes out_{};
+    std::thread thread_;
+};

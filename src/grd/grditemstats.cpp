@@ -88,10 +88,13 @@ GrdExtremes updateElements(const T* p, int64_t n, T delT, bool hasDelete, GrdEle
 
 // One update over the n values of type T; stats is null for global
 // statistics only, else holds the records of the first nStats elements.
+// A pass begun beside the write (float and double only) stands in for the
+// global scan.
 template <class T>
 void updateTyped(GrdItem* item, const void* data, int64_t n, T delT, bool hasDelete, GrdElementStats* stats,
-                 int64_t nStats, double del) {
+                 int64_t nStats, double del, GrdExtremesBeside* started = nullptr) {
     const T* p = static_cast<const T*>(data);
+    if (started != nullptr && stats == nullptr) return mergeGlobal(item, started->result(), del);
     const int64_t withRecords = stats == nullptr ? 0 : std::clamp<int64_t>(nStats, 0, n);
     if (withRecords > 0) mergeGlobal(item, updateElements(p, withRecords, delT, hasDelete, stats, del), del);
     // Elements beyond the records (never the case for a consistent header)
@@ -112,14 +115,14 @@ int32_t countOf(double count) {
 }
 
 // The update with the item's n used elements, switched once on the data type.
-void update(const GrdHeader* h, GrdItem* item, const void* values, int64_t n) {
+void update(const GrdHeader* h, GrdItem* item, const void* values, int64_t n, GrdExtremesBeside* started) {
     // An item whose records were not made (memory) keeps global statistics.
     GrdElementStats* stats = perElement(h) ? item->elemStats.get() : nullptr;
     const int64_t nStats = stats != nullptr ? item->elemStatsCount : 0;
     const double del = h->deleteValDouble;
     switch (item->dataType) {
-        case RCF_FLOAT: updateTyped<float>(item, values, n, h->deleteValFloat, true, stats, nStats, del); break;
-        case RCF_DOUBLE: updateTyped<double>(item, values, n, del, true, stats, nStats, del); break;
+        case RCF_FLOAT: updateTyped<float>(item, values, n, h->deleteValFloat, true, stats, nStats, del, started); break;
+        case RCF_DOUBLE: updateTyped<double>(item, values, n, del, true, stats, nStats, del, started); break;
         // A byte is taken as a signed 8-bit value, like its delete value.
         case RCF_BYTE:
             updateTyped<int8_t>(item, values, n, static_cast<int8_t>(h->deleteValByte), true, stats, nStats, del);
@@ -152,13 +155,23 @@ int32_t checkUpdate(GrdHeader* header, int32_t itemNo, const GrdApiTrace& trace)
 
 }  // namespace
 
-int32_t grdCalcStatistics(GrdHeader* header, int32_t itemNo, const void* values) {
+void grdStartGlobalStatistics(const GrdHeader* header, const GrdItem* item, const void* values, int64_t n,
+                              std::optional<GrdExtremesBeside>& pass) {
+    if (header == nullptr || item == nullptr || values == nullptr || n <= 0) return;
+    if (header->statsType != F_ITEM_STATS_GLOBAL) return;
+    if (item->dataType == RCF_FLOAT && GrdExtremesBeside::worthwhile(n * 4))
+        pass.emplace(static_cast<const float*>(values), n, header->deleteValFloat);
+    if (item->dataType == RCF_DOUBLE && GrdExtremesBeside::worthwhile(n * 8))
+        pass.emplace(static_cast<const double*>(values), n, header->deleteValDouble);
+}
+
+int32_t grdCalcStatistics(GrdHeader* header, int32_t itemNo, const void* values, GrdExtremesBeside* started) {
     GrdApiTrace trace("grdCalcStatistics %d", itemNo);
     const int32_t status = checkUpdate(header, itemNo, trace);
     if (status != F_NO_ERROR && status != F_ERR_VALUE) return trace.done(status);
     GrdItem* item = &header->items[itemNo - 1];
     const int64_t n = grdItemUsedElementCount(item);
-    if (n > 0 && values != nullptr) update(header, item, values, n);
+    if (n > 0 && values != nullptr) update(header, item, values, n, started);
     return trace.done(status);
 }
 

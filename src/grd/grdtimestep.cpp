@@ -10,6 +10,7 @@
 #include <climits>
 #include <cmath>
 #include <cstring>
+#include <optional>
 
 #include "common/capi.h"
 #include "grd/fileio.h"
@@ -282,12 +283,15 @@ int32_t writeItem(GrdHeader* header, FileHandle file, double time, const void* d
         status = writeTimeStepBlock(header, file, time);
         if (status != F_NO_ERROR) return status;
     }
+    // The extremes of a large item are found beside the record's write.
+    std::optional<GrdExtremesBeside> extremes;
+    grdStartGlobalStatistics(header, c.item, stored, c.used, extremes);
     status = grdCheckWriteLR(header, c.item->dataType, static_cast<uint32_t>(c.used), stored, file, kModule,
                              __LINE__);
     if (status != F_NO_ERROR) return status;
     // The record is on disk: the cursor moves on even if the statistics
     // refuse the header's statistics type.
-    const int32_t stats = grdCalcStatistics(header, header->nextItem + 1, stored);
+    const int32_t stats = grdCalcStatistics(header, header->nextItem + 1, stored, extremes ? &*extremes : nullptr);
     advanceCursor(header);
     return stats;
 }

@@ -134,6 +134,72 @@ TEST_F(Stats, GlobalStatisticsKeepExtremesAndCountDeleteValues) {
     EXPECT_EQ(takeCodes(), Codes{});
 }
 
+// Items of a megabyte and more have their extremes scanned beside the
+// record's write (on a helper thread where the process may use two
+// processors): the statistics are those of the plain scan, on the writer's
+// header and in the file.
+TEST_F(Stats, LargeItemsScannedBesideTheWriteKeepExactGlobalStatistics) {
+    makeHeader(F_EQTIME_FIXEDSPACE_ALLITEMS, 2, F_ITEM_STATS_GLOBAL);
+    ASSERT_EQ(grdSetEqTimeAxis(header_, 1400, 0.0, 1.0, 0), 0);
+    defineItem(1, RCF_FLOAT, 1024, 300);  // 1.2 MB
+    defineItem(2, RCF_DOUBLE, 400, 400);  // 1.3 MB
+    create();
+    std::vector<float> f(1024 * 300);
+    std::vector<double> d(400 * 400);
+    double fMin = 1e300, fMax = -1e300, dMin = 1e300, dMax = -1e300;
+    int32_t fDeletes = 0, dDeletes = 0;
+    for (int32_t s = 0; s < 3; ++s) {
+        for (size_t i = 0; i < f.size(); ++i) {
+            f[i] = (i + s) % 13 == 0 ? kDelF : static_cast<float>((i * 7919 + s * 31) % 100003) * 0.5f - 20000.0f;
+            if (f[i] == kDelF) {
+                ++fDeletes;
+                continue;
+            }
+            fMin = std::min(fMin, static_cast<double>(f[i]));
+            fMax = std::max(fMax, static_cast<double>(f[i]));
+        }
+        for (size_t i = 0; i < d.size(); ++i) {
+            d[i] = (i * 3 + s) % 17 == 0 ? kDelD : std::sin(static_cast<double>(i + s * 7)) * 1e5;
+            if (d[i] == kDelD) {
+                ++dDeletes;
+                continue;
+            }
+            dMin = std::min(dMin, d[i]);
+            dMax = std::max(dMax, d[i]);
+        }
+        ASSERT_EQ(grdWriteItemTimeStep(header_, file_, s, f.data()), 0);
+        ASSERT_EQ(grdWriteItemTimeStep(header_, file_, s, d.data()), 0);
+    }
+    auto expectGlobal = [&](HeaderHandle h) {
+        double min = 0, max = 0;
+        int32_t deletes = 0;
+        ASSERT_EQ(grdGetItemStatsGlobal(grdItemD(h, 1), &min, &max, &deletes), 0);
+        EXPECT_EQ(min, fMin);
+        EXPECT_EQ(max, fMax);
+        EXPECT_EQ(deletes, fDeletes);
+        ASSERT_EQ(grdGetItemStatsGlobal(grdItemD(h, 2), &min, &max, &deletes), 0);
+        EXPECT_EQ(min, dMin);
+        EXPECT_EQ(max, dMax);
+        EXPECT_EQ(deletes, dDeletes);
+    };
+    expectGlobal(header_);
+    reopen();
+    expectGlobal(rh());
+
+    // The pass itself: the same result as the scan on the caller's thread,
+    // on a thread of its own exactly when one is worth starting.
+    GrdExtremesBeside beside(d.data(), static_cast<int64_t>(d.size()), kDelD);
+    EXPECT_EQ(beside.onOwnThread(), GrdExtremesBeside::worthwhile(static_cast<int64_t>(d.size() * 8)));
+    const GrdExtremes got = beside.result();
+    const GrdExtremes want = grdScanExtremes(d.data(), static_cast<int64_t>(d.size()), kDelD);
+    EXPECT_EQ(got.min, want.min);
+    EXPECT_EQ(got.max, want.max);
+    EXPECT_EQ(got.values, want.values);
+    EXPECT_EQ(got.deletes, want.deletes);
+    EXPECT_FALSE(GrdExtremesBeside(d.data(), 1000, kDelD).onOwnThread());  // too short to be worth it
+    EXPECT_EQ(takeCodes(), Codes{});
+}
+
 TEST_F(Stats, EveryDataTypeContributesWithItsOwnDeleteValue) {
     makeHeader(F_EQTIME_FIXEDSPACE_ALLITEMS, 6, 1);
     for (int32_t type = RCF_DOUBLE; type <= RCF_UINT2; ++type) defineItem(type - 1, type, 4);

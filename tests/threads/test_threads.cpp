@@ -1,8 +1,9 @@
 // Threads: distinct files are independent. Eight threads at once each create,
 // write, close, open and read back their own record file (through the
 // file-open layer, whose failures reach the process-wide handler table),
-// gridded data file, VRE file and cross-section file, while unit conversions
-// run beside them. The
+// gridded data files (one with items large enough for the statistics' helper
+// thread), VRE file and cross-section file, while unit conversions run
+// beside them. The
 // CI runs this program under ThreadSanitizer, which fails it on any data
 // race; tracing is off and handlers are installed before the threads start.
 #include <gtest/gtest.h>
@@ -84,6 +85,35 @@ Result gridFile(const std::string& path, const hardtest::Contents& expected) {
     if (read.values != expected.values || read.times != expected.times || read.staticItems != expected.staticItems)
         return "grd: values";
     return {};
+}
+
+// A gridded file of one megabyte-sized item with global statistics, whose
+// extremes are scanned on a helper thread beside each record's write.
+Result largeGridFile(const std::string& path, int seed) {
+    HeaderHandle h = nullptr;
+    if (grdHeaderCreate(F_EQTIME_FIXEDSPACE_ALLITEMS, "large", "tests", 1, 1, F_ITEM_STATS_GLOBAL, &h) != 0)
+        return "large grd: header";
+    ItemHandle item = grdItemD(h, 1);
+    Result result;
+    if (grdSetEqTimeAxis(h, 1400, 0.0, 60.0, 0) != 0 || grdSetItemInfo(h, item, QTY_ITEM_UNDEFINED, "big", 0, RCF_FLOAT) != 0 ||
+        grdSetItemAxisEqD2(item, 0, 1024, 256, 0.0f, 0.0f, 1.0f, 1.0f) != 0)
+        result = "large grd: items";
+    FileHandle f = nullptr;
+    if (result.empty() && grdFileCreate(path.c_str(), h, &f) != 0) result = "large grd: create";
+    std::vector<float> values(1024 * 256);
+    for (int s = 0; s < 2 && result.empty(); ++s) {
+        for (size_t i = 0; i < values.size(); ++i) values[i] = static_cast<float>((i + s) % 1000) - seed;
+        values[5] = F_DELETE_VALUE_FLOAT;
+        if (grdWriteItemTimeStep(h, f, s, values.data()) != 0) result = "large grd: write";
+    }
+    double min = 0, max = 0;
+    int32_t deletes = 0;
+    if (result.empty() && (grdGetItemStatsGlobal(item, &min, &max, &deletes) != 0 || min != -seed ||
+                           max != 999 - seed || deletes != 2))
+        result = "large grd: statistics";
+    if (f != nullptr && grdFileClose(h, &f) != 0 && result.empty()) result = "large grd: close";
+    grdHeaderDestroy(&h);
+    return result;
 }
 
 Result vreFile(const std::string& path, int seed) {
@@ -176,6 +206,7 @@ TEST(Threads, DistinctFilesOnEightThreadsAtOnce) {
             const std::string base = dir.file("t" + std::to_string(t));
             for (int round = 0; round < kRounds && failures[t].empty(); ++round) {
                 for (Result r : {recordFile(base + ".rcf", t), gridFile(base + ".grd", reference),
+                                 largeGridFile(base + "-large.grd", t),
                                  vreFile(base + ".vre", t), xfsFile(base + ".xfs", t), conversions(t)}) {
                     if (failures[t].empty() && !r.empty()) failures[t] = r + " (round " + std::to_string(round) + ")";
                 }

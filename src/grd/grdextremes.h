@@ -5,7 +5,6 @@
 
 #include <cstdint>
 #include <limits>
-#include <thread>
 
 // Extremes over the values that are not the delete value, and the counts.
 // With no ordinary value min is +inf (or the type's maximum) and max -inf.
@@ -63,14 +62,14 @@ GrdExtremes grdScanExtremesScalar(const T* p, int64_t n, T del, bool hasDelete) 
 GrdExtremes grdScanExtremes(const float* p, int64_t n, float del) noexcept;
 GrdExtremes grdScanExtremes(const double* p, int64_t n, double del) noexcept;
 
-// The scan of a large float or double array run on a second thread, beside
-// the caller writing the same values to the file, so that the pass costs
-// (almost) no time where the process may use a second processor: started by
-// the constructor, waited for by result() (or the destructor). It runs on the
-// caller's thread instead, inside result(), when the process is bound to one
-// processor, the environment sets TOVA_NO_THREADS, or the thread cannot be
-// started. The helper thread blocks every signal. The array must not change
-// until result() returned.
+// The scan of a large float or double array run on the library's helper
+// thread, beside the caller writing the same values to the file, so that the
+// pass costs the caller (almost) no time where the process may use a second
+// processor: handed over by the constructor, waited for by result() (or the
+// destructor). It runs on the caller's thread instead, inside result(), when
+// the process may use one processor only, the environment sets
+// TOVA_NO_THREADS, the helper is busy with another caller's scan, or it
+// cannot be started. The array must not change until result() returned.
 class GrdExtremesBeside {
 public:
     GrdExtremesBeside(const float* p, int64_t n, float del) noexcept;
@@ -80,21 +79,24 @@ public:
     GrdExtremesBeside& operator=(const GrdExtremesBeside&) = delete;
 
     GrdExtremes result() noexcept;
-    // Whether a scan of this many bytes is worth a thread of its own here.
+    // Whether a scan of this many bytes is handed to the helper here.
     static bool worthwhile(int64_t bytes) noexcept;
-    // Whether the scan was started on a thread of its own.
-    bool onOwnThread() const noexcept { return ranBeside_; }
+    // Whether the scan was handed to the helper thread.
+    bool onHelper() const noexcept { return handedOver_; }
+
+    // What the helper runs (public for it; not for callers).
+    void run() noexcept;
+    bool finished = false;  // set by the helper under its lock
 
 private:
     void start() noexcept;
-    void run() noexcept;
 
     const void* p_;
     int64_t n_;
     double del_;
     bool isFloat_;
+    void* helper_ = nullptr;  // the helper it was handed to
+    bool handedOver_ = false;
     bool done_ = false;
-    bool ranBeside_ = false;
     GrdExtremes out_{};
-    std::thread thread_;
 };

@@ -8,6 +8,9 @@
 #include <limits>
 #include <vector>
 
+#include <sys/wait.h>
+#include <unistd.h>
+
 #include "grd/grddynamic.h"
 #include "test_dynamic_support.h"
 
@@ -134,18 +137,18 @@ TEST_F(Stats, GlobalStatisticsKeepExtremesAndCountDeleteValues) {
     EXPECT_EQ(takeCodes(), Codes{});
 }
 
-// Items of a megabyte and more have their extremes scanned beside the
+// Items of 2 MiB and more have their extremes scanned beside the
 // record's write (on a helper thread where the process may use two
 // processors): the statistics are those of the plain scan, on the writer's
 // header and in the file.
 TEST_F(Stats, LargeItemsScannedBesideTheWriteKeepExactGlobalStatistics) {
     makeHeader(F_EQTIME_FIXEDSPACE_ALLITEMS, 2, F_ITEM_STATS_GLOBAL);
     ASSERT_EQ(grdSetEqTimeAxis(header_, 1400, 0.0, 1.0, 0), 0);
-    defineItem(1, RCF_FLOAT, 1024, 300);  // 1.2 MB
-    defineItem(2, RCF_DOUBLE, 400, 400);  // 1.3 MB
+    defineItem(1, RCF_FLOAT, 1024, 600);  // 2.4 MB
+    defineItem(2, RCF_DOUBLE, 600, 500);  // 2.4 MB
     create();
-    std::vector<float> f(1024 * 300);
-    std::vector<double> d(400 * 400);
+    std::vector<float> f(1024 * 600);
+    std::vector<double> d(600 * 500);
     double fMin = 1e300, fMax = -1e300, dMin = 1e300, dMax = -1e300;
     int32_t fDeletes = 0, dDeletes = 0;
     for (int32_t s = 0; s < 3; ++s) {
@@ -187,16 +190,32 @@ TEST_F(Stats, LargeItemsScannedBesideTheWriteKeepExactGlobalStatistics) {
     expectGlobal(rh());
 
     // The pass itself: the same result as the scan on the caller's thread,
-    // on a thread of its own exactly when one is worth starting.
+    // handed to the helper exactly when that is worth it; a second pass while
+    // the first may still run (on the helper or here) gives the same.
     GrdExtremesBeside beside(d.data(), static_cast<int64_t>(d.size()), kDelD);
-    EXPECT_EQ(beside.onOwnThread(), GrdExtremesBeside::worthwhile(static_cast<int64_t>(d.size() * 8)));
+    GrdExtremesBeside second(d.data(), static_cast<int64_t>(d.size()), kDelD);
+    EXPECT_EQ(beside.onHelper(), GrdExtremesBeside::worthwhile(static_cast<int64_t>(d.size() * 8)));
+    EXPECT_EQ(second.result().max, dMax);
     const GrdExtremes got = beside.result();
     const GrdExtremes want = grdScanExtremes(d.data(), static_cast<int64_t>(d.size()), kDelD);
     EXPECT_EQ(got.min, want.min);
     EXPECT_EQ(got.max, want.max);
     EXPECT_EQ(got.values, want.values);
     EXPECT_EQ(got.deletes, want.deletes);
-    EXPECT_FALSE(GrdExtremesBeside(d.data(), 1000, kDelD).onOwnThread());  // too short to be worth it
+    EXPECT_FALSE(GrdExtremesBeside(d.data(), 1000, kDelD).onHelper());  // too short to be worth it
+
+    // A child made by fork has no helper thread: it scans by itself (an alarm
+    // ends it should it wait for the parent's helper).
+    const pid_t child = fork();
+    ASSERT_GE(child, 0);
+    if (child == 0) {
+        alarm(10);
+        GrdExtremesBeside inChild(d.data(), static_cast<int64_t>(d.size()), kDelD);
+        _exit(!inChild.onHelper() && inChild.result().max == dMax ? 0 : 1);
+    }
+    int status = 0;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << status;
     EXPECT_EQ(takeCodes(), Codes{});
 }
 

@@ -87,8 +87,9 @@ Result gridFile(const std::string& path, const hardtest::Contents& expected) {
     return {};
 }
 
-// A gridded file of one megabyte-sized item with global statistics, whose
-// extremes are scanned on a helper thread beside each record's write.
+// A gridded file of one 2 MiB item with global statistics, whose extremes
+// are scanned by the library's helper thread beside each record's write (or
+// by the writer, when another thread's scan keeps the helper busy).
 Result largeGridFile(const std::string& path, int seed) {
     HeaderHandle h = nullptr;
     if (grdHeaderCreate(F_EQTIME_FIXEDSPACE_ALLITEMS, "large", "tests", 1, 1, F_ITEM_STATS_GLOBAL, &h) != 0)
@@ -96,11 +97,11 @@ Result largeGridFile(const std::string& path, int seed) {
     ItemHandle item = grdItemD(h, 1);
     Result result;
     if (grdSetEqTimeAxis(h, 1400, 0.0, 60.0, 0) != 0 || grdSetItemInfo(h, item, QTY_ITEM_UNDEFINED, "big", 0, RCF_FLOAT) != 0 ||
-        grdSetItemAxisEqD2(item, 0, 1024, 256, 0.0f, 0.0f, 1.0f, 1.0f) != 0)
+        grdSetItemAxisEqD2(item, 0, 1024, 512, 0.0f, 0.0f, 1.0f, 1.0f) != 0)
         result = "large grd: items";
     FileHandle f = nullptr;
     if (result.empty() && grdFileCreate(path.c_str(), h, &f) != 0) result = "large grd: create";
-    std::vector<float> values(1024 * 256);
+    std::vector<float> values(1024 * 512);
     for (int s = 0; s < 2 && result.empty(); ++s) {
         for (size_t i = 0; i < values.size(); ++i) values[i] = static_cast<float>((i + s) % 1000) - seed;
         values[5] = F_DELETE_VALUE_FLOAT;

@@ -204,11 +204,6 @@ GrdExtremes grdScanExtremes(const double* p, int64_t n, double del) noexcept { r
 
 namespace {
 
-// Below this size the hand-over (a wake-up of the helper, tens of
-// microseconds on a virtual machine) costs about what the scan would: items
-// of 1 MiB wrote no faster with the helper, items of 2 and 4 MB did.
-constexpr int64_t kBesideBytes = int64_t{2} << 20;
-
 // Processors this process may run on: a process bound to one (a rank of a
 // parallel model pinned to its core) would only share it with the helper.
 unsigned usableProcessors() noexcept {
@@ -322,7 +317,7 @@ private:
 
 }  // namespace
 
-bool GrdExtremesBeside::worthwhile(int64_t bytes) noexcept { return bytes >= kBesideBytes && besideAllowed(); }
+bool GrdExtremesBeside::worthwhile(int64_t bytes) noexcept { return bytes >= kMinBytes && besideAllowed(); }
 
 GrdExtremesBeside::GrdExtremesBeside(const float* p, int64_t n, float del) noexcept
     : p_(p), n_(n), del_(del), isFloat_(true) {

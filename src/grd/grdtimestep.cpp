@@ -285,7 +285,8 @@ int32_t writeItem(GrdHeader* header, FileHandle file, double time, const void* d
     }
     // The extremes of a large item are found beside the record's write.
     std::optional<GrdExtremesBeside> extremes;
-    grdStartGlobalStatistics(header, c.item, stored, c.used, extremes);
+    if (c.used * c.size >= GrdExtremesBeside::kMinBytes)
+        grdStartGlobalStatistics(header, c.item, stored, c.used, extremes);
     status = grdCheckWriteLR(header, c.item->dataType, static_cast<uint32_t>(c.used), stored, file, kModule,
                              __LINE__);
     if (status != F_NO_ERROR) return status;

@@ -1247,7 +1247,9 @@ private:
         heading("5. Statistics",
                 "Workload 1 written by tova with statistics type 1 (item-global extremes) and type 2 (also per "
                 "element: extremes, sums for mean, variance and lag-one autocorrelation). Median of " +
-                    std::to_string(opt_.repeats) + ".");
+                    std::to_string(opt_.repeats) +
+                    (Clock::wall ? "; wall-clock time."
+                                 : "; process CPU time, the statistics pass on the library's helper thread included."));
         const ContenderKind* tova = nullptr;
         const ContenderKind* raw = nullptr;
         for (auto* k : kinds_) {

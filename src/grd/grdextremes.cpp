@@ -8,6 +8,7 @@
 
 #include <condition_variable>
 #include <cstdlib>
+#include <memory>
 #include <mutex>
 #include <thread>
 #include <type_traits>
@@ -220,17 +221,19 @@ bool besideAllowed() noexcept {
     return allowed;
 }
 
+}  // namespace
+
 // The helper: one thread for the whole process, started at the first large
 // scan and parked on a condition variable between scans. It takes one scan
 // at a time; a caller that finds it busy scans itself. It is never joined:
 // it lives (parked) until the process ends, its state is never freed, and
 // the shared library is marked never to be unloaded, so no exit or unload
 // order can pull anything from under it.
-class Helper {
+class GrdExtremesHelper {
 public:
     // The process's helper, started on first use; null when it cannot be.
-    static Helper* instance() noexcept {
-        static Helper* const helper = start();
+    static GrdExtremesHelper* instance() noexcept {
+        static GrdExtremesHelper* const helper = start();
         // A child made by fork has no helper thread: it scans itself.
         if (helper != nullptr && !helper->inCreatorProcess()) return nullptr;
         return helper;
@@ -246,16 +249,16 @@ public:
 
     void waitFor(GrdExtremesBeside* scan) noexcept {
         std::unique_lock<std::mutex> lock(mutex_);
-        done_.wait(lock, [scan] { return scan->finished; });
+        done_.wait(lock, [scan] { return scan->finished_; });
     }
 
 private:
-    Helper() = default;
+    GrdExtremesHelper() = default;
 
-    static Helper* start() noexcept {
-        Helper* helper = nullptr;
+    static GrdExtremesHelper* start() noexcept {
+        std::unique_ptr<GrdExtremesHelper> helper;
         try {
-            helper = new Helper;  // never freed (see above)
+            helper.reset(new GrdExtremesHelper);
         } catch (...) {
             return nullptr;
         }
@@ -270,18 +273,15 @@ private:
 #endif
         bool started = false;
         try {
-            std::thread(&Helper::loop, helper).detach();
+            std::thread(&GrdExtremesHelper::loop, helper.get()).detach();
             started = true;
         } catch (...) {
         }
 #if defined(__unix__) || defined(__APPLE__)
         if (masked) pthread_sigmask(SIG_SETMASK, &previous, nullptr);
 #endif
-        if (!started) {
-            delete helper;
-            return nullptr;
-        }
-        return helper;
+        // Once the thread runs, its state lives as long as the process.
+        return started ? helper.release() : nullptr;
     }
 
     bool inCreatorProcess() const noexcept {
@@ -300,7 +300,7 @@ private:
             lock.unlock();
             scan->run();
             lock.lock();
-            scan->finished = true;
+            scan->finished_ = true;
             job_ = nullptr;
             done_.notify_all();
         }
@@ -315,8 +315,6 @@ private:
 #endif
 };
 
-}  // namespace
-
 bool GrdExtremesBeside::worthwhile(int64_t bytes) noexcept { return bytes >= kMinBytes && besideAllowed(); }
 
 GrdExtremesBeside::GrdExtremesBeside(const float* p, int64_t n, float del) noexcept
@@ -330,7 +328,7 @@ GrdExtremesBeside::GrdExtremesBeside(const double* p, int64_t n, double del) noe
 }
 
 GrdExtremesBeside::~GrdExtremesBeside() {
-    if (handedOver_ && !done_) static_cast<Helper*>(helper_)->waitFor(this);
+    if (handedOver_ && !done_) helper_->waitFor(this);
 }
 
 void GrdExtremesBeside::run() noexcept {
@@ -340,7 +338,7 @@ void GrdExtremesBeside::run() noexcept {
 
 void GrdExtremesBeside::start() noexcept {
     if (!worthwhile(n_ * (isFloat_ ? 4 : 8))) return;
-    Helper* helper = Helper::instance();
+    GrdExtremesHelper* helper = GrdExtremesHelper::instance();
     handedOver_ = helper != nullptr && helper->tryHandOver(this);
     helper_ = helper;
 }
@@ -348,7 +346,7 @@ void GrdExtremesBeside::start() noexcept {
 GrdExtremes GrdExtremesBeside::result() noexcept {
     if (done_) return out_;
     if (handedOver_) {
-        static_cast<Helper*>(helper_)->waitFor(this);
+        helper_->waitFor(this);
     } else {
         run();
     }

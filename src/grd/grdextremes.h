@@ -70,6 +70,8 @@ GrdExtremes grdScanExtremes(const double* p, int64_t n, double del) noexcept;
 // the process may use one processor only, the environment sets
 // TOVA_NO_THREADS, the helper is busy with another caller's scan, or it
 // cannot be started. The array must not change until result() returned.
+class GrdExtremesHelper;
+
 class GrdExtremesBeside {
 public:
     GrdExtremesBeside(const float* p, int64_t n, float del) noexcept;
@@ -88,19 +90,18 @@ public:
     // Whether the scan was handed to the helper thread.
     bool onHelper() const noexcept { return handedOver_; }
 
-    // What the helper runs (public for it; not for callers).
-    void run() noexcept;
-    bool finished = false;  // set by the helper under its lock
-
 private:
+    friend class GrdExtremesHelper;
     void start() noexcept;
+    void run() noexcept;
 
     const void* p_;
     int64_t n_;
     double del_;
     bool isFloat_;
-    void* helper_ = nullptr;  // the helper it was handed to
+    GrdExtremesHelper* helper_ = nullptr;  // the helper it was handed to
     bool handedOver_ = false;
+    bool finished_ = false;  // set by the helper under its lock
     bool done_ = false;
     GrdExtremes out_{};
 };

@@ -43,7 +43,8 @@ int32_t grdCalcStatistics(GrdHeader* header, int32_t itemNo, const void* values,
                           GrdExtremesBeside* started = nullptr);
 // Begins the statistics' extremes pass over the n values of item about to be
 // written, beside the write (see GrdExtremesBeside), when the header keeps
-// global statistics only and the values are many floats or doubles; else
-// leaves pass empty and grdCalcStatistics does all the work.
+// global statistics only and the values are floats or doubles; else leaves
+// pass empty and grdCalcStatistics does all the work. Meant for records of
+// GrdExtremesBeside::kMinBytes and more.
 void grdStartGlobalStatistics(const GrdHeader* header, const GrdItem* item, const void* values, int64_t n,
                               std::optional<GrdExtremesBeside>& pass);

@@ -25,6 +25,20 @@ GrdExtremes grdScanExtremesScalar(const T* p, int64_t n, T del, bool hasDelete) 
                                                              : std::numeric_limits<T>::max();
     constexpr T kLow = std::numeric_limits<T>::has_infinity ? -std::numeric_limits<T>::infinity()
                                                             : std::numeric_limits<T>::lowest();
+    // Fewer values than lanes (a scalar item) need no lanes.
+    if (n < kLanes) {
+        T low = kHigh;
+        T high = kLow;
+        int64_t dels = 0;
+        for (int64_t i = 0; i < n; ++i) {
+            const T v = p[i];
+            const bool isDelete = hasDelete && v == del;
+            dels += isDelete;
+            low = (!isDelete && v < low) ? v : low;
+            high = (!isDelete && v > high) ? v : high;
+        }
+        return GrdExtremes{static_cast<double>(low), static_cast<double>(high), n - dels, dels};
+    }
     T lo[kLanes];
     T hi[kLanes];
     int64_t deletes[kLanes];

@@ -22,22 +22,8 @@ constexpr const char* kModule = kModGrdItemStats;
 // The global pass of one data type.
 template <class T>
 GrdExtremes scanGlobal(const T* p, int64_t n, T del, bool hasDelete) {
-    // A few values (a scalar or short item, written once per call) are not
-    // worth the set-up of a vector scan.
-    if (n < 8) {
-        GrdExtremes e{std::numeric_limits<double>::infinity(), -std::numeric_limits<double>::infinity(), 0, 0};
-        for (int64_t i = 0; i < n; ++i) {
-            if (hasDelete && p[i] == del) {
-                ++e.deletes;
-                continue;
-            }
-            const double x = static_cast<double>(p[i]);
-            e.min = x < e.min ? x : e.min;
-            e.max = x > e.max ? x : e.max;
-        }
-        e.values = n - e.deletes;
-        return e;
-    }
+    // A scalar or short item (written once per call) skips the vector set-up.
+    if (n < 8) return grdScanExtremesScalar(p, n, del, hasDelete);
     if constexpr (std::is_same_v<T, float> || std::is_same_v<T, double>) {
         return grdScanExtremes(p, n, del);
     } else {
@@ -159,10 +145,9 @@ void grdStartGlobalStatistics(const GrdHeader* header, const GrdItem* item, cons
                               std::optional<GrdExtremesBeside>& pass) {
     if (header == nullptr || item == nullptr || values == nullptr || n <= 0) return;
     if (header->statsType != F_ITEM_STATS_GLOBAL) return;
-    if (item->dataType == RCF_FLOAT && GrdExtremesBeside::worthwhile(n * 4))
-        pass.emplace(static_cast<const float*>(values), n, header->deleteValFloat);
-    if (item->dataType == RCF_DOUBLE && GrdExtremesBeside::worthwhile(n * 8))
-        pass.emplace(static_cast<const double*>(values), n, header->deleteValDouble);
+    // The pass itself decides whether the helper takes it.
+    if (item->dataType == RCF_FLOAT) pass.emplace(static_cast<const float*>(values), n, header->deleteValFloat);
+    if (item->dataType == RCF_DOUBLE) pass.emplace(static_cast<const double*>(values), n, header->deleteValDouble);
 }
 
 int32_t grdCalcStatistics(GrdHeader* header, int32_t itemNo, const void* values, GrdExtremesBeside* started) {

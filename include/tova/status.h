@@ -75,6 +75,12 @@ enum {
     F_ERR_UNIT = 2020          /* unit not valid for the item's quantity type */
 };
 
+/* The fixed text of a status code: its name, a colon and its meaning, e.g.
+ * "F_ERR_OPEN: the file could not be opened"; "unknown status" for a code
+ * outside the table. The text is static: never freed, valid for the life of
+ * the library, safe from any thread. */
+TOVA_API const char* TOVA_CALL grdGetStatusText(int32_t status);
+
 /* User error handler: a notification hook called with the context of a
  * failure before the status is returned to the caller. The return value is
  * ignored. */

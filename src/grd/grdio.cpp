@@ -60,6 +60,39 @@ intptr_t TOVA_CALL grdAddCommonErrorHandler(grdErrorHandler /*handler*/) {
 
 void TOVA_CALL grdInitSystem(void) { clearHandlers(); }
 
+const char* TOVA_CALL grdGetStatusText(int32_t status) {
+    // One fixed text per code: the code's trace name, then what it means.
+    switch (status) {
+    case F_NO_ERROR: return "F_NO_ERROR: success";
+    case F_EOF: return "F_EOF: end of file met";
+    case F_ERR_ARGUMENT: return "F_ERR_ARGUMENT: a required argument is null or of the wrong kind";
+    case F_ERR_TIMESTEP_RANGE: return "F_ERR_TIMESTEP_RANGE: time-step index out of range";
+    case F_ERR_ITEM_RANGE: return "F_ERR_ITEM_RANGE: no such item or static item";
+    case F_ERR_MEMORY: return "F_ERR_MEMORY: memory allocation failed";
+    case F_ERR_READ: return "F_ERR_READ: reading from the file failed or no record where one was expected";
+    case F_ERR_WRITE: return "F_ERR_WRITE: writing to the file failed";
+    case F_ERR_OPEN: return "F_ERR_OPEN: the file could not be opened";
+    case F_ERR_CLOSE: return "F_ERR_CLOSE: closing the file failed";
+    case F_ERR_FLUSH: return "F_ERR_FLUSH: flushing the file's buffers failed";
+    case F_ERR_SEEK: return "F_ERR_SEEK: positioning in the file failed";
+    case F_ERR_ITEMNO: return "F_ERR_ITEMNO: item number out of range";
+    case F_ERR_ELEMENT: return "F_ERR_ELEMENT: element index out of range";
+    case F_ERR_TYPE: return "F_ERR_TYPE: a record or block of the wrong type";
+    case F_ERR_VALUE: return "F_ERR_VALUE: a value not valid or not supported here";
+    case F_ERR_DATE_FORMAT: return "F_ERR_DATE_FORMAT: the date text could not be parsed";
+    case F_ERR_TIME_FORMAT: return "F_ERR_TIME_FORMAT: the time-of-day text could not be parsed";
+    case F_ERR_SIZE: return "F_ERR_SIZE: a record or block of the wrong size or count";
+    case F_ERR_NOT_RCF: return "F_ERR_NOT_RCF: not a record file";
+    case F_ERR_READONLY: return "F_ERR_READONLY: the file is open for reading only";
+    case F_ERR_NOT_BLOCK: return "F_ERR_NOT_BLOCK: no block start where a block was expected";
+    case F_ERR_APP_TAG: return "F_ERR_APP_TAG: the file's application tag does not match";
+    case F_ERR_DATA_TYPE: return "F_ERR_DATA_TYPE: data type or operation not allowed for this file";
+    case F_ERR_SKIP: return "F_ERR_SKIP: a skip did not land on a valid record";
+    case F_ERR_UNIT: return "F_ERR_UNIT: the unit is not valid for the item's quantity";
+    default: return "unknown status";
+    }
+}
+
 int32_t TOVA_CALL grdDebugOn(int32_t flag) {
     tova::g_traceApi.store(flag, std::memory_order_relaxed);
     return flag;

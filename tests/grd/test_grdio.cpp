@@ -105,3 +105,12 @@ TEST_F(Handlers, DebugOnStoresFlagAsGiven) {
     EXPECT_EQ(grdDebugOn(7), 7);
     EXPECT_EQ(grdDebugOn(0), 0);
 }
+
+TEST(StatusText, EveryCodeHasItsNameAndUnknownCodesSaySo) {
+    EXPECT_STREQ(grdGetStatusText(F_ERR_OPEN), "F_ERR_OPEN: the file could not be opened");
+    EXPECT_STREQ(grdGetStatusText(0), "F_NO_ERROR: success");
+    for (int32_t code : {1, 1000, 1001, 1002}) EXPECT_STREQ(std::string(grdGetStatusText(code)).substr(0, 2).c_str(), "F_");
+    for (int32_t code = 2000; code <= 2020; ++code) EXPECT_EQ(std::string(grdGetStatusText(code)).rfind("F_ERR_", 0), 0u) << code;
+    EXPECT_STREQ(grdGetStatusText(2021), "unknown status");
+    EXPECT_STREQ(grdGetStatusText(-1), "unknown status");
+}

@@ -118,9 +118,11 @@ int main(int argc, char** argv) {
         std::printf("grd_raii: %s: time step 3 at %g h, first value %g\n", path.c_str(), time, values[0]);
         if (time != 3.0 || values[0] != 3.0f) return 1;
 
-        // A failure is an exception with the library's text.
+        // A failure is an exception with the library's text (the position
+        // after the last step exists; the one after it does not).
         try {
-            in.seek(steps);
+            in.seek(steps + 1);
+            return 1;
         } catch (const tova::Error& e) {
             std::printf("grd_raii: as expected, %s\n", e.what());
         }

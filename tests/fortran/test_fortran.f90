@@ -12,6 +12,8 @@ program test_fortran
   type(c_ptr) :: header, file, item
   integer(c_int32_t) :: status, level, metre, foot, unit, n, dataType, found, inHeader
   character(len=:), allocatable :: name, unitText, date, clock
+  real(c_double), pointer :: edges(:)
+  type(c_ptr) :: edgesPtr
   integer :: failures, t
 
   failures = 0
@@ -28,6 +30,7 @@ program test_fortran
   ! Write: header, static item, then the engine's loop.
   call ok(grdHeaderCreate(F_EQTIME_FIXEDSPACE_ALLITEMS, "Fortran test", "test_fortran", 3, 1, &
                           F_ITEM_STATS_GLOBAL, header), "header")
+  call ok(grdSetAppTitle(header, "engine under test   "), "app title")
   call ok(grdSetItemInfo(header, grdItemD(header, 1), level, "Water level", metre, RCF_FLOAT), "item")
   call ok(grdSetItemAxisEqD2(grdItemD(header, 1), metre, nx, ny, 0.0, 0.0, 10.0, 10.0), "axis")
   call ok(grdSetEqCalendarAxis(header, "2025-03-01", "12:00:00", QTY_UNIT_SECOND, 0.0d0, 60.0d0, 0), "time axis")
@@ -50,6 +53,7 @@ program test_fortran
   ! Read back: texts, the static item, every step, then a jump.
   call ok(grdFileRead(path, header, file), "read")
   call expect(grdGetFileTitle(header) == "Fortran test", "file title")
+  call expect(grdGetAppTitle(header) == "engine under test", "application title, trailing blanks dropped")
   call ok(grdGetItemInfo(grdItemD(header, 1), name=name, unitText=unitText, dataType=dataType), "item info")
   call expect(name == "Water level" .and. unitText == "m" .and. dataType == RCF_FLOAT, "item info values")
   call ok(grdGetCalendarAxis(header, date, clock, noOfTimeSteps=n), "calendar axis")
@@ -82,6 +86,16 @@ program test_fortran
   call ok(grdHeaderDestroy(header), "destroy read")
   status = grdFileRead("no such folder/none.grd", header, file)
   call expect(status == F_ERR_OPEN .and. .not. c_associated(file), "missing file")
+
+  ! A non-equidistant axis: its boundaries come back lent by the header.
+  call ok(grdHeaderCreate(F_NEQTIME_FIXEDSPACE_ALLITEMS, "Axes", "test_fortran", 1, 1, F_ITEM_STATS_GLOBAL, &
+                          header), "header 2")
+  call ok(grdSetItemInfo(header, grdItemD(header, 1), level, "Level", metre, RCF_DOUBLE), "item 2")
+  call ok(grdSetItemAxisNeqD1(grdItemD(header, 1), metre, 3, [0.0d0, 1.0d0, 3.0d0, 7.0d0], 0), "neq axis")
+  call ok(grdGetItemAxisNeqD1(grdItemD(header, 1), xSize=n, xCoords=edgesPtr), "neq axis back")
+  call c_f_pointer(edgesPtr, edges, [n + 1])
+  call expect(n == 3 .and. all(edges == [0.0d0, 1.0d0, 3.0d0, 7.0d0]), "neq axis values")
+  call ok(grdHeaderDestroy(header), "destroy 2")
 
   ! A consistent file is left as it is by recovery.
   call ok(grdFileRecover(path, found, inHeader), "recover")

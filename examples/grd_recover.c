@@ -46,7 +46,10 @@ static int crash(const char* path) {
         fill(values, step);
         if (failed(grdWriteItemTimeStep(header, file, step * 60.0, values), "writing")) return 1;
     }
-    /* Killed here: no close, and buffered output is lost as well. */
+    /* Killed here: no close, and the library's buffered output is lost as
+     * well. */
+    printf("grd_recover: killed after %d time steps\n", CRASH_AFTER);
+    fflush(stdout);
     _Exit(3);
 }
 

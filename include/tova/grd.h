@@ -135,22 +135,28 @@ TOVA_API int32_t TOVA_CALL grdGetVersionCurrent(void);
 
 /* ---- File-level attributes ------------------------------------------------ */
 
+/** The header's file type (FileType). */
 TOVA_API int32_t TOVA_CALL grdGetFileType(HeaderHandle header);                 /**< null: 0 */
+/** The file title, lent by the header. */
 TOVA_API const char* TOVA_CALL grdGetFileTitle(HeaderHandle header);            /**< never null */
 /** Sets the file title (copied). 1000 for a null header. */
 TOVA_API int32_t TOVA_CALL grdSetFileTitle(HeaderHandle header, const char* title);
+/** The title of the writing application, lent by the header. */
 TOVA_API const char* TOVA_CALL grdGetAppTitle(HeaderHandle header);             /**< never null */
 /** Sets the title of the writing application (copied). 1000 for a null header. */
 TOVA_API int32_t TOVA_CALL grdSetAppTitle(HeaderHandle header, const char* title);
+/** The version number of the writing application. */
 TOVA_API int32_t TOVA_CALL grdGetAppVersionNo(HeaderHandle header);             /**< null: -1 */
 /** Sets the version number of the writing application. 1000 for a null header. */
 TOVA_API int32_t TOVA_CALL grdSetAppVersionNo(HeaderHandle header, int32_t versionNo);
 /** Caller-defined content class; its absolute value names the extension. */
+/** The caller-defined data type (content class). */
 TOVA_API int32_t TOVA_CALL grdGetDataType(HeaderHandle header);                 /**< null: 0 */
 /** Sets the caller-defined data type (content class); its absolute value selects the extension plug-in
  * "grdExt_<n>" (grdEnablePlugin). 1000 for a null header.
  */
 TOVA_API int32_t TOVA_CALL grdSetDataType(HeaderHandle header, int32_t dataType);
+/** The statistics type chosen at creation (ItemStatsType). */
 TOVA_API int32_t TOVA_CALL grdGetItemStatsType(HeaderHandle header);            /**< null: 0 */
 
 /** Delete values per element type (null header: 0). Setters do not validate. */
@@ -179,6 +185,7 @@ TOVA_API int32_t TOVA_CALL grdSetDeleteValUnsignedInt(HeaderHandle header, uint3
 TOVA_API int32_t TOVA_CALL grdParamModifyTimes(HeaderHandle header, int32_t flag);
 
 /** Map projection. */
+/** The kind of map projection (GeoInfoType); 0 when none is set. */
 TOVA_API int32_t TOVA_CALL grdGetGeoInfoType(HeaderHandle header);              /**< null: 0 */
 /** Sets the map projection: its text (copied), the longitude and latitude of the origin and the orientation
  * (degrees). 1000 for a null header.
@@ -209,6 +216,7 @@ TOVA_API int32_t TOVA_CALL grdGetCustomBlock(CustomBlockHandle block, int32_t* s
 
 /* ---- Items ---------------------------------------------------------------- */
 
+/** Number of dynamic items; item numbers run from 1 to it. */
 TOVA_API int32_t TOVA_CALL grdGetNoOfItems(HeaderHandle header);                /**< null: 0 */
 /** Item itemNo (1-based); null when the header is null or the number is out
  * of range (2007). */
@@ -240,6 +248,7 @@ TOVA_API int32_t TOVA_CALL grdGetItemInfo_(ItemHandle item, int32_t* itemType, c
 
 /** Settings stored and returned unchanged. */
 TOVA_API int32_t TOVA_CALL grdSetItemValueType(ItemHandle item, int32_t valueType);
+/** The value type stored with grdSetItemValueType; valueType must not be null (1000). */
 TOVA_API int32_t TOVA_CALL grdGetItemValueType(ItemHandle item, int32_t* valueType); /**< out required */
 /** Sets how values of the item are converted between the caller and the file: mode 0 none; 1 from and to the
  * unit library's user unit of the item's quantity; 2 from and to unit (an alternative unit of the quantity);
@@ -297,6 +306,7 @@ TOVA_API int32_t TOVA_CALL grdGetUsedItemBytes(ItemHandle item);
 
 /** Static associations: links from item itemNo to static item numbers. */
 TOVA_API int32_t TOVA_CALL grdSetAssocStatic(HeaderHandle header, int32_t itemNo, int32_t staticNo);
+/** Number of static items associated with item itemNo. */
 TOVA_API int32_t TOVA_CALL grdGetNoAssocStatic(HeaderHandle header, int32_t itemNo); /**< error: 0 */
 /** index is 1-based; *staticNo is 0 when the chain is shorter. */
 TOVA_API int32_t TOVA_CALL grdGetAssocStatic(HeaderHandle header, int32_t itemNo, int32_t index,
@@ -309,7 +319,9 @@ TOVA_API int32_t TOVA_CALL grdSetEncodeKey(HeaderHandle header, const int32_t* x
                                            const int32_t* zKey, int32_t length);
 /** Copies each stored key into the caller's buffer of the same position. */
 TOVA_API int32_t TOVA_CALL grdGetEncodeKey(HeaderHandle header, int32_t* xKey, int32_t* yKey, int32_t* zKey);
+/** Length of the encoding keys of a compressed file: the elements stored per item and time step. */
 TOVA_API int32_t TOVA_CALL grdGetEncodeKeySize(HeaderHandle header);   /**< null: 0 */
+/** Non-zero when the header holds encoding keys (a compressed file). */
 TOVA_API int32_t TOVA_CALL grdIsFileCompressed(HeaderHandle header);   /**< null: 0 */
 /** Lets grdGetItemElements count only the key's elements; returns header. */
 TOVA_API HeaderHandle TOVA_CALL grdItemEnableCompression(HeaderHandle header);
@@ -327,6 +339,7 @@ TOVA_API int32_t TOVA_CALL grdIsItemCompressed(ItemHandle item, int32_t* length)
  * node ((X+1)(Y+1) or (X+1)(Y+1)(Z+1)). The last int32 of the coordinate
  * setters is not used. */
 
+/** Kind of the item's spatial axis (ItemAxisType). */
 TOVA_API int32_t TOVA_CALL grdGetItemAxisType(ItemHandle item);        /**< null: 0 */
 
 /** Gives the item a single value (no spatial extent); unit: unit of the axis coordinates. 1000 for a null
@@ -473,6 +486,7 @@ TOVA_API int32_t TOVA_CALL grdSetNeqCalendarAxis(HeaderHandle header, const char
                                                  const char* startTime, int32_t unit, double startOffset,
                                                  int32_t firstIndex);
 
+/** Kind of the header's time axis (TimeAxisType); says which time-axis getter applies. */
 TOVA_API int32_t TOVA_CALL grdGetTimeAxisType(HeaderHandle header);   /**< null: 0 */
 /** Unit, unit text, start, step, number of time steps and first index of an equidistant time axis; the unit
  * text is lent. 1000 for a null header or another axis kind.

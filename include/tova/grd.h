@@ -246,7 +246,8 @@ TOVA_API int32_t TOVA_CALL grdGetItemInfo(ItemHandle item, int32_t* itemType, co
 TOVA_API int32_t TOVA_CALL grdGetItemInfo_(ItemHandle item, int32_t* itemType, const char** name,
                                            const char** unitText, int32_t* dataType);
 
-/** Settings stored and returned unchanged. */
+/** Stores the item's value type, a caller-defined classification of its values (0 by default), returned
+ * unchanged by grdGetItemValueType. The settings below are stored and returned unchanged as well. */
 TOVA_API int32_t TOVA_CALL grdSetItemValueType(ItemHandle item, int32_t valueType);
 /** The value type stored with grdSetItemValueType; valueType must not be null (1000). */
 TOVA_API int32_t TOVA_CALL grdGetItemValueType(ItemHandle item, int32_t* valueType); /**< out required */
@@ -268,11 +269,11 @@ TOVA_API int32_t TOVA_CALL grdGetItemAxisUnitConversion(ItemHandle item, int32_t
  * item.
  */
 TOVA_API int32_t TOVA_CALL grdSetItemAxisOrientation(ItemHandle item, float alpha, float phi, float theta);
-/** Null item: -1e-35 in every output. */
+/** The orientation angles of the item's axis; for a null item -1e-35 in every output. */
 TOVA_API int32_t TOVA_CALL grdGetItemAxisOrientation(ItemHandle item, float* alpha, float* phi, float* theta);
 /** Reference coordinates, converted by the axis unit conversion mode. */
 TOVA_API int32_t TOVA_CALL grdSetItemRefCoords(ItemHandle item, float x, float y, float z);
-/** Null item: -1e-35 in every output. */
+/** The item's reference coordinates, converted for the caller; for a null item -1e-35 in every output. */
 TOVA_API int32_t TOVA_CALL grdGetItemRefCoords(ItemHandle item, float* x, float* y, float* z);
 
 /** Quantity type of the axis: 100185-100188 for 0-D to 3-D axes, else 999. */

@@ -11,11 +11,13 @@
 
 TOVA_EXTERN_C_BEGIN
 
-/** Variadic forms use the platform's default calling convention. */
+/* Variadic forms use the platform's default calling convention. */
+/** Prints an entry line at the current depth (printf-style format) and indents the lines after it. */
 TOVA_API void DebugEnter(const char* format, ...);
 /** Prints one line at the current depth, as an entry immediately followed by its exit (printf-style format).
  */
 TOVA_API void DebugEnterExit(const char* format, ...);
+/** Ends the indentation of the last DebugEnter and prints an exit line (printf-style format). */
 TOVA_API int32_t DebugExit(const char* format, ...); /**< returns the line counter */
 /** Prints one line at the current depth (printf-style format). */
 TOVA_API void DebugPrint(const char* format, ...);

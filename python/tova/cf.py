@@ -27,7 +27,7 @@ import re
 import numpy as np
 
 from . import _udunits, units
-from .errors import TovaError, UnitError
+from .errors import F_ERR_UNIT, F_ERR_VALUE, TovaError, UnitError
 
 CONVENTIONS = "CF-1.10"
 METADATA_BLOCK = "CF_METADATA"
@@ -152,7 +152,7 @@ def match_unit(text: str, what: str = "") -> units.Unit:
                 return u
     hint = "UDUNITS-2 cannot read it" if _udunits.available() and _udunits.parse(text) is None else \
         "no unit of the unit library has that factor" if _udunits.available() else "UDUNITS-2 is not installed"
-    raise UnitError(0, detail=f"{what}: unit {text!r} has no match in the unit library ({hint}); "
+    raise UnitError(F_ERR_UNIT, detail=f"{what}: unit {text!r} has no match in the unit library ({hint}); "
                               f"name one with --unit-map VAR=UNIT (or units={{VAR: UNIT}} of to_grd)")
 
 
@@ -174,7 +174,7 @@ def match_quantity(unit: units.Unit, standard_name: str | None = None, quantity=
     for q in ordered:
         if q.key not in (999,) and unit.key in (u.key for u in units.units_of(q)):
             return q
-    raise UnitError(0, detail=f"no quantity of the unit library has the unit {unit.name!r}")
+    raise UnitError(F_ERR_UNIT, detail=f"no quantity of the unit library has the unit {unit.name!r}")
 
 
 def time_unit_of(text: str) -> str | None:
@@ -320,7 +320,7 @@ def storable_array(values: np.ndarray) -> tuple:
             return wide.ravel(), kind.str
     if kind.kind == "f":
         return values.astype(np.float64).ravel(), kind.str
-    raise TovaError(0, detail=f"arrays of type {kind} are not kept")
+    raise TovaError(F_ERR_VALUE, detail=f"arrays of type {kind} are not kept")
 
 
 def custom_block_attrs(custom_blocks) -> dict:
@@ -480,7 +480,27 @@ def decorate(ds, f, *, decode_times: bool = True):
         hit = _DIRECTION.match(str(name))
         if hit and ds[name].ndim == 1 and "axis_kind" in ds[name].attrs:
             ds[name].attrs.update(coordinate_attrs(hit.group(1), ds[name].attrs.get("units", ""), mapping is not None))
-    return ds
+        ds[name].encoding.setdefault("_FillValue", None)
+    for var in ds.variables.values():  # netCDF classic files take no 64-bit integer attributes
+        var.attrs = _int32_attrs(var.attrs)
+    ds.attrs = _int32_attrs(ds.attrs)
+    return ds.rename({n: cf_name(n, ds.variables) for n in ds.data_vars if cf_name(n, ds.variables) != n})
+
+
+def cf_name(name: str, taken=()) -> str:
+    """A variable name as CF recommends it (letters, digits, underscores,
+    beginning with a letter); the item's own name stays in long_name."""
+    fixed = re.sub(r"[^A-Za-z0-9_]", "_", str(name))
+    if not fixed[:1].isalpha():
+        fixed = "v_" + fixed
+    while fixed != name and fixed in taken:
+        fixed += "_"
+    return fixed
+
+
+def _int32_attrs(attrs: dict) -> dict:
+    return {k: np.int32(v) if isinstance(v, (int, np.integer)) and not isinstance(v, bool)
+            and -2**31 <= v < 2**31 else v for k, v in attrs.items()}
 
 
 def _curvilinear_coords(ds, name: str, axis):
@@ -550,6 +570,8 @@ def _restore(ds, f, meta: dict, time_name: str, time, decode_times: bool):
     out = xr.Dataset({k: v for k, v in variables.items() if k not in coords},
                      coords={k: v for k, v in variables.items() if k in coords},
                      attrs=decode_attrs(meta.get("attrs")))
+    if meta.get("unlimited_dims"):
+        out.encoding["unlimited_dims"] = set(meta["unlimited_dims"])
     return out
 
 

@@ -369,7 +369,8 @@ def _add_variable(ds, plan: _Plan, name, var, tdim, units_map, skip, warn) -> No
 
 
 def _plan(ds, units_map: dict, skip: bool, warn) -> _Plan:
-    plan = _Plan(meta={"attrs": cf.encode_attrs(ds.attrs), "variables": []})
+    plan = _Plan(meta={"attrs": cf.encode_attrs(ds.attrs), "variables": [],
+                       "unlimited_dims": sorted(ds.encoding.get("unlimited_dims", ()))})
     tdim = _time_dim(ds)
     if tdim is None:
         raise Unmappable(F_ERR_VALUE, detail="the dataset has no time dimension (a time coordinate, or a "
@@ -421,8 +422,9 @@ def to_grd(ds, path, *, units: dict | None = None, skip_unmappable: bool = False
     options.setdefault("app_version", int(version) if np.ndim(version) == 0 and str(version).isdigit() else 0)
     options.setdefault("projection", plan.projection)
     statics = []
+    deletes = grd.DeleteValues(*options.get("delete_values") or grd.DeleteValues())
     for source in plan.statics:
-        source.item.values = source.values(delete=grd.DeleteValues().for_dtype(source.item.dtype))
+        source.item.values = source.values(delete=deletes.for_dtype(source.item.dtype))
         statics.append(source.item)
     n = plan.times.size
     with grd.create(path, [s.item for s in plan.items], plan.time_axis, static_items=statics, custom_blocks=blocks,

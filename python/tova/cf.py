@@ -249,14 +249,16 @@ def encode_value(value):
         array = np.asarray(value)
         if array.dtype.kind in "fiub":
             return {"__array__": array.dtype.str, "shape": list(array.shape), "data": array.ravel().tolist()}
-        return array.tolist()
+        if array.dtype.kind in "US":
+            return array.tolist()
+        raise TypeError(f"an array of type {array.dtype}")
     if isinstance(value, (list, tuple)):
         return [encode_value(v) for v in value]
     if isinstance(value, dict):
         return {str(k): encode_value(v) for k, v in value.items()}
     if isinstance(value, (str, bool, int, float)) or value is None:
         return value
-    return str(value)
+    raise TypeError(f"a value of type {type(value).__name__}")
 
 
 def decode_value(value):
@@ -273,8 +275,17 @@ def decode_value(value):
     return value
 
 
-def encode_attrs(attrs: dict) -> dict:
-    return {str(k): encode_value(v) for k, v in attrs.items()}
+def encode_attrs(attrs: dict, lost: list | None = None, owner: str = "") -> dict:
+    """Attributes as JSON data; those that cannot be kept are left out and
+    named in ``lost`` ("owner: name (type)")."""
+    out = {}
+    for k, v in attrs.items():
+        try:
+            out[str(k)] = encode_value(v)
+        except TypeError as exc:
+            if lost is not None:
+                lost.append(f"{owner}{k} ({exc})")
+    return out
 
 
 def decode_attrs(attrs: dict) -> dict:

@@ -76,6 +76,7 @@ class _Plan:
     arrays: dict = field(default_factory=dict)
     blocks: dict = field(default_factory=dict)
     skipped: list = field(default_factory=list)
+    lost: list = field(default_factory=list)  # attributes that could not be kept
 
 
 # ---- Recognising the parts of a dataset --------------------------------------------------
@@ -193,8 +194,8 @@ def _plan_time(ds, tdim: str, plan: _Plan) -> None:
         if calendar:
             encoding.setdefault("calendar", calendar)
         attrs = {k: v for k, v in var.attrs.items() if k not in ("units", "calendar")}
-        plan.meta["time"] = {"name": tdim, "dim": tdim, "attrs": cf.encode_attrs(attrs),
-                             "encoding": cf.encode_attrs(encoding)}
+        plan.meta["time"] = {"name": tdim, "dim": tdim, "attrs": cf.encode_attrs(attrs, plan.lost, "time: "),
+                             "encoding": cf.encode_attrs(encoding, plan.lost, "time: ")}
         plan.meta["time_units"] = (units_text, calendar)
 
 
@@ -310,17 +311,18 @@ def _kept_encoding(var) -> dict:
     return encoding
 
 
-def _entry(name, var, kind: str, **extra) -> dict:
+def _entry(plan: _Plan, name, var, kind: str, **extra) -> dict:
     encoding = _kept_encoding(var)
-    return {"name": name, "kind": kind, "dims": list(var.dims), "attrs": cf.encode_attrs(var.attrs),
-            "encoding": cf.encode_attrs(encoding), **extra}
+    return {"name": name, "kind": kind, "dims": list(var.dims),
+            "attrs": cf.encode_attrs(var.attrs, plan.lost, f"attribute of {name!r}: "),
+            "encoding": cf.encode_attrs(encoding, plan.lost, f"encoding of {name!r}: "), **extra}
 
 
 def _keep_array(plan: _Plan, name: str, var, coord: bool) -> None:
     """A variable kept whole in the custom blocks (coordinates, bounds, grid
     mappings); dates as numbers in the time axis's units."""
     values = var.values
-    entry = _entry(name, var, "array", coord=coord, shape=list(values.shape))
+    entry = _entry(plan, name, var, "array", coord=coord, shape=list(values.shape))
     if values.dtype.kind == "M" or values.dtype == object and values.size and hasattr(values.flat[0], "calendar"):
         units_text, calendar = plan.meta.get("time_units", (None, None))
         values = _encode_times(var, units_text, calendar)[0]
@@ -364,17 +366,18 @@ def _add_variable(ds, plan: _Plan, name, var, tdim, units_map, skip, warn) -> No
     group.append(_Source(name, item, var, tdim if over_time else None, spatial))
     stored_dims = ([tdim] if over_time else []) + list(spatial)
     masked = var.dtype.kind == "f" or "_FillValue" in var.encoding or "missing_value" in var.encoding
-    plan.meta["variables"].append(_entry(name, var, kind, number=len(group), stored_dims=stored_dims,
+    plan.meta["variables"].append(_entry(plan, name, var, kind, number=len(group), stored_dims=stored_dims,
                                          masked=bool(masked)))
 
 
 def _plan(ds, units_map: dict, skip: bool, warn) -> _Plan:
-    plan = _Plan(meta={"attrs": cf.encode_attrs(ds.attrs), "variables": [],
+    plan = _Plan(meta={"attrs": {}, "variables": [],
                        "unlimited_dims": sorted(ds.encoding.get("unlimited_dims", ()))})
     tdim = _time_dim(ds)
     if tdim is None:
         raise Unmappable(F_ERR_VALUE, detail="the dataset has no time dimension (a time coordinate, or a "
                                              "dimension named \"time\")")
+    plan.meta["attrs"] = cf.encode_attrs(ds.attrs, plan.lost, "global attribute: ")
     _plan_time(ds, tdim, plan)
     mappings, described = _special(ds)
     for name in ds.variables:
@@ -393,6 +396,8 @@ def _plan(ds, units_map: dict, skip: bool, warn) -> _Plan:
         if found:
             plan.projection = grd.Projection(*found)
     plan.meta.pop("time_units", None)
+    for text in plan.lost:
+        warn(f"{text} has no place in the file: left out")
     for key, value in ds.attrs.items():
         if key.startswith(cf.CUSTOM_ATTR_PREFIX):
             block = key[len(cf.CUSTOM_ATTR_PREFIX):]

@@ -167,9 +167,10 @@ def open_tova_dataset(path, *, mask_and_scale: bool = True, decode_times: bool =
                 name = _unique(item.name, variables.keys() | grids.coords.keys() | {"time"}, f"{item.name}_static")
                 if name in drop:
                     continue
-                values = f.mask_values(item, item.values.copy()) if mask_and_scale else item.values
+                masked = mask_and_scale and cf.masked(meta, "static", item.number)
+                values = f.mask_values(item, item.values.copy()) if masked else item.values
                 variables[name] = xr.Variable(dims, values, _item_attrs(f, item, tova_static_item=item.number),
-                                              _encoding(f, item, mask_and_scale))
+                                              _encoding(f, item, masked))
         coords.update(grids.coords)
         ds = xr.Dataset(variables, coords={k: v for k, v in coords.items() if k not in drop},
                         attrs=_global_attrs(f))

@@ -10,10 +10,10 @@
 
 using tooltest::runTova;
 
-TEST(ToolConvert, GriddedFileToNetcdfAndBack) {
+TEST(ToolConvert, DemoFileToNetcdfThatCfReadersDecodeAndBack) {
     testutil::TempDir dir;
-    const std::string grd = dir.file("run.grd"), nc = dir.file("run.nc"), back = dir.file("back.grd");
-    tooltest::writeGridFile(grd);
+    const std::string grd = dir.file("demo.grd"), nc = dir.file("demo.nc"), back = dir.file("back.grd");
+    ASSERT_EQ(runTova({"demo", grd}).exitCode, 0);
     const tooltest::Run toNetcdf = runTova({"convert", grd, nc});
     if (toNetcdf.exitCode == 1 && toNetcdf.err.find("needs the Python package") != std::string::npos) {
         GTEST_SKIP() << "no Python package tova with xarray: " << toNetcdf.err;
@@ -23,13 +23,26 @@ TEST(ToolConvert, GriddedFileToNetcdfAndBack) {
     ASSERT_GE(head.size(), 4u);
     EXPECT_EQ(std::string(head.begin() + 1, head.begin() + 4), "HDF");  // netCDF-4 by default
 
+    // The grid and the time axis as a CF reader finds them.
+    if (std::system("ncdump -h /dev/null > /dev/null 2>&1") != 127 * 256) {
+        const std::string header = dir.file("header.txt");
+        ASSERT_EQ(std::system(("ncdump -h '" + nc + "' > '" + header + "'").c_str()), 0);
+        const std::vector<uint8_t> bytes = testutil::readBytes(header);
+        const std::string text(bytes.begin(), bytes.end());
+        for (const char* expected : {"time:units = \"seconds since 2024-03-21\"", "time:calendar = \"proleptic_gregorian\"",
+                                     "x:standard_name = \"projection_x_coordinate\"", "Water_level:grid_mapping = \"crs\"",
+                                     "crs:grid_mapping_name = \"transverse_mercator\"", ":Conventions = \"CF-1.10\""}) {
+            EXPECT_NE(text.find(expected), std::string::npos) << expected;
+        }
+    }
+
     const tooltest::Run toGrid = runTova({"convert", nc, back});
     ASSERT_EQ(toGrid.exitCode, 0) << toGrid.err;
     const auto items = [](const std::string& path) {
         const tooltest::Run info = runTova({"info", path, "--json"});
-        nlohmann::json names;
-        for (const auto& item : nlohmann::json::parse(info.out)["grd"]["items"]) names.push_back(item["name"]);
-        return names;
+        nlohmann::json out;
+        for (const auto& item : nlohmann::json::parse(info.out)["grd"]["items"]) out.push_back(item["quantity"]);
+        return out;
     };
     EXPECT_EQ(items(back), items(grd));
     EXPECT_EQ(runTova({"check", back}).exitCode, 0);

@@ -76,7 +76,10 @@ _UDUNITS_SPELLING = {
 }
 # Time units of CF "U since ..." texts.
 _CF_TIME_UNITS = {"s": "seconds", "min": "minutes", "h": "hours", "day": "days", "ms": "milliseconds"}
-_STANDARD_CALENDARS = ("standard", "gregorian", "proleptic_gregorian")
+# Calendars of a calendar axis (whose dates are proleptic Gregorian).
+STANDARD_CALENDARS = ("standard", "gregorian", "proleptic_gregorian")
+# Names of the backend's axis coordinates: x, y, z, with a suffix per grid.
+_DIRECTION = re.compile(r"^([xyz])(_\d+)?$")
 # Quantities tried first when only a unit is known: the general ones.
 _GENERAL_QUANTITIES = range(40600, 40700)
 
@@ -406,10 +409,6 @@ def curvilinear_nodes(centres: np.ndarray) -> np.ndarray:
     return 0.25 * (c[:-1, :-1] + c[1:, :-1] + c[:-1, 1:] + c[1:, 1:])
 
 
-
-_DIRECTION = re.compile(r"^([xyz])(_\d+)?$")
-
-
 def _time_variable(f, meta: dict | None, decode_times: bool):
     """The time coordinate: the axis's times with CF units (and the stored
     attributes and encoding of a file written from a CF dataset), decoded
@@ -462,7 +461,7 @@ def decorate(ds, f, *, decode_times: bool = True):
     meta = metadata_of(f.custom_blocks)
     time_name, time = _time_variable(f, meta, decode_times)
     if meta is not None:
-        return _restore(ds, f, meta, time_name, time, decode_times)
+        return _restore(ds, meta, time_name, time, decode_times)
     import xarray as xr
 
     ds = ds.assign_coords(time=time)
@@ -532,7 +531,7 @@ def _curvilinear_coords(ds, name: str, axis):
     return ds
 
 
-def _restore(ds, f, meta: dict, time_name: str, time, decode_times: bool):
+def _restore(ds, meta: dict, time_name: str, time, decode_times: bool):
     """The dataset a file was written from, from its CF metadata."""
     import xarray as xr
 

@@ -23,6 +23,8 @@ from .errors import TovaError
 _GRD_MAGIC = (b"QTA_GRD_", b"_ATQ_DRG")
 _NETCDF_MAGIC = (b"CDF\x01", b"CDF\x02", b"CDF\x05", b"\x89HDF\r\n\x1a\n")
 FORMATS = {"netcdf4": "NETCDF4", "classic": "NETCDF3_CLASSIC"}
+# Time steps go to netCDF in runs of about this many bytes.
+_RUN_BYTES = 8 << 20
 
 
 def kind_of(path: str) -> str:
@@ -66,9 +68,13 @@ def _grd_to_netcdf(source: str, target: str, fmt: str, progress: Progress) -> No
     import xarray as xr
     from dask.callbacks import Callback
 
+    from .grd import open as tova_open
     from .xarray_backend import TovaBackendEntrypoint
 
-    with xr.open_dataset(source, engine=TovaBackendEntrypoint, chunks={"time": 1}) as ds:
+    with tova_open(source) as f:  # runs of time steps of a few MiB: few tasks, little memory
+        step_bytes = sum(it.size * 8 for it in f.items)
+        run = max(1, _RUN_BYTES // max(step_bytes, 1))
+    with xr.open_dataset(source, engine=TovaBackendEntrypoint, chunks={"time": run}) as ds:
         steps = ds.sizes.get("time", 0)
         job = ds.to_netcdf(target, format=FORMATS[fmt], compute=False)
 

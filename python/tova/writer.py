@@ -33,9 +33,10 @@ from .grd import Axis, Item, StaticItem, TimeAxis
 
 _DEGREES = re.compile(r"^degrees?(_?(east|north|E|N))?$", re.IGNORECASE)
 _SINCE = re.compile(r"^\s*(\w+)\s+since\s+(.+?)\s*$")
+# Time steps are read from the dataset in runs of about this many bytes.
+_RUN_BYTES = 8 << 20
 _ENCODING_KEPT = ("_FillValue", "missing_value", "dtype", "units", "calendar", "scale_factor", "add_offset",
                   "coordinates")
-_STORED = (np.float32, np.float64, np.int32, np.uint32)
 
 
 class Unmappable(TovaError):
@@ -52,9 +53,13 @@ class _Source:
     tdim: str | None
     spatial: tuple
 
-    def values(self, step: int | None = None, delete=None) -> np.ndarray:
-        var = self.var if step is None else self.var.isel({self.tdim: step})
-        data = np.asarray(var.transpose(*self.spatial).values)
+    def values(self, steps: slice | None = None, delete=None) -> np.ndarray:
+        """The values of a static item, or of a run of time steps (time
+        first), as the item's element type."""
+        if steps is None:
+            data = np.asarray(self.var.transpose(*self.spatial).values)
+        else:
+            data = np.asarray(self.var.isel({self.tdim: steps}).transpose(self.tdim, *self.spatial).values)
         dtype = self.item.dtype
         if dtype.kind == "f" or data.dtype.kind != "f":
             return np.asarray(data, dtype=dtype)
@@ -140,7 +145,7 @@ def _encode_times(var, units_text=None, calendar=None) -> tuple:
 def _calendar_start(reference: str, calendar: str | None):
     """The start date of a calendar axis for a CF reference date: whole
     seconds, years 1 to 9999, a standard calendar; else None."""
-    if (calendar or "standard").lower() not in cf._STANDARD_CALENDARS:
+    if (calendar or "standard").lower() not in cf.STANDARD_CALENDARS:
         return None
     try:
         import pandas as pd
@@ -436,11 +441,17 @@ def to_grd(ds, path, *, units: dict | None = None, skip_unmappable: bool = False
                     **options) as writer:
         deletes = [writer.delete_values.for_dtype(s.item.dtype) for s in plan.items]
         timed = not plan.time_axis.is_equidistant
-        for t in range(n):
-            writer.append([s.values(t, d) for s, d in zip(plan.items, deletes)],
-                          time=float(plan.times[t]) if timed else None)
-            if progress is not None:
-                progress(t + 1, n)
+        # Steps are read in runs of a few MiB: one read per run instead of
+        # one per step, and memory bounded whatever the length of the file.
+        step_bytes = sum(s.item.size * s.item.dtype.itemsize for s in plan.items)
+        run = max(1, _RUN_BYTES // max(step_bytes, 1))
+        for first in range(0, n, run):
+            steps = slice(first, min(first + run, n))
+            blocks = [s.values(steps, d) for s, d in zip(plan.items, deletes)]
+            for k, t in enumerate(range(steps.start, steps.stop)):
+                writer.append([b[k] for b in blocks], time=float(plan.times[t]) if timed else None)
+                if progress is not None:
+                    progress(t + 1, n)
     return plan.skipped
 
 

@@ -23,6 +23,7 @@ from __future__ import annotations
 import json
 import math
 import re
+import warnings
 
 import numpy as np
 
@@ -459,10 +460,17 @@ def decorate(ds, f, *, decode_times: bool = True):
     attributes, a grid-mapping variable, 2-D coordinates of curvilinear
     grids and a CF time coordinate."""
     meta = metadata_of(f.custom_blocks)
-    time_name, time = _time_variable(f, meta, decode_times)
     if meta is not None:
-        return _restore(ds, meta, time_name, time, decode_times)
+        try:
+            time_name, time = _time_variable(f, meta, decode_times)
+            return _restore(ds, meta, time_name, time, decode_times)
+        except (ValueError, KeyError, TypeError, IndexError) as exc:
+            # Metadata that no longer fits the file (a file changed by other
+            # writers since): the file as it is.
+            warnings.warn(f"{f.path}: CF metadata left aside, it does not fit the file ({exc})", stacklevel=2)
     import xarray as xr
+
+    _, time = _time_variable(f, None, decode_times)
 
     ds = ds.assign_coords(time=time)
     ds.attrs = {"Conventions": CONVENTIONS, **ds.attrs, **custom_block_attrs(f.custom_blocks)}

@@ -76,7 +76,8 @@ _UDUNITS_SPELLING = {
     "acre-ft/day": "acre foot/day", "%": "percent",
 }
 # Time units of CF "U since ..." texts.
-_CF_TIME_UNITS = {"s": "seconds", "min": "minutes", "h": "hours", "day": "days", "ms": "milliseconds"}
+_CF_TIME_UNITS = {"s": "seconds", "min": "minutes", "h": "hours", "day": "days", "week": "weeks",
+                  "ms": "milliseconds"}
 # Calendars of a calendar axis (whose dates are proleptic Gregorian).
 STANDARD_CALENDARS = ("standard", "gregorian", "proleptic_gregorian")
 # Names of the backend's axis coordinates: x, y, z, with a suffix per grid.

@@ -29,10 +29,14 @@ TEST(ToolConvert, DemoFileToNetcdfThatCfReadersDecodeAndBack) {
         ASSERT_EQ(std::system(("ncdump -h '" + nc + "' > '" + header + "'").c_str()), 0);
         const std::vector<uint8_t> bytes = testutil::readBytes(header);
         const std::string text(bytes.begin(), bytes.end());
-        for (const char* expected : {"time:units = \"seconds since 2024-03-21\"", "time:calendar = \"proleptic_gregorian\"",
-                                     "x:standard_name = \"projection_x_coordinate\"", "Water_level:grid_mapping = \"crs\"",
-                                     "crs:grid_mapping_name = \"transverse_mercator\"", ":Conventions = \"CF-1.10\""}) {
-            EXPECT_NE(text.find(expected), std::string::npos) << expected;
+        const char* const expected[] = {"time:units = \"seconds since 2024-03-21\"",
+                                        "time:calendar = \"proleptic_gregorian\"",
+                                        "x:standard_name = \"projection_x_coordinate\"",
+                                        "Water_level:grid_mapping = \"crs\"",
+                                        "crs:grid_mapping_name = \"transverse_mercator\"",
+                                        ":Conventions = \"CF-1.10\""};
+        for (const char* line : expected) {
+            EXPECT_NE(text.find(line), std::string::npos) << line;
         }
     }
 

@@ -44,8 +44,9 @@ TEST(ToolConvert, DemoFileToNetcdfThatCfReadersDecodeAndBack) {
     ASSERT_EQ(toGrid.exitCode, 0) << toGrid.err;
     const auto items = [](const std::string& path) {
         const tooltest::Run info = runTova({"info", path, "--json"});
+        const nlohmann::json parsed = nlohmann::json::parse(info.out);
         nlohmann::json out;
-        for (const auto& item : nlohmann::json::parse(info.out)["grd"]["items"]) out.push_back(item["quantity"]);
+        for (const auto& item : parsed["grd"]["items"]) out.push_back(item["quantity"]);
         return out;
     };
     EXPECT_EQ(items(back), items(grd));

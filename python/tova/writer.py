@@ -339,9 +339,23 @@ def _keep_array(plan: _Plan, name: str, var, coord: bool) -> None:
     plan.meta["variables"].append(entry)
 
 
+def _direction_rank(ds, dim: str) -> int:
+    """2 for an x (longitude) dimension, 1 for y (latitude), 0 for others:
+    a file's x varies fastest, so x goes last in numpy order."""
+    if dim not in ds.coords:
+        return 0
+    attrs = ds[dim].attrs
+    text = " ".join(str(attrs.get(k, "")) for k in ("axis", "standard_name", "units"))
+    if re.search(r"\bX\b|longitude|projection_x_coordinate|degrees?_?(east|E)\b", text):
+        return 2
+    if re.search(r"\bY\b|latitude|projection_y_coordinate|degrees?_?(north|N)\b", text):
+        return 1
+    return 0
+
+
 def _add_variable(ds, plan: _Plan, name, var, tdim, units_map, skip, warn) -> None:
     time_dims = {d for d in var.dims if d != tdim and d in ds.coords and _is_time(ds[d])}
-    spatial = tuple(d for d in var.dims if d != tdim)
+    spatial = tuple(sorted((d for d in var.dims if d != tdim), key=lambda d: _direction_rank(ds, d)))
     try:
         if time_dims:
             raise Unmappable(F_ERR_VALUE, detail=f"it lies over the time dimension {sorted(time_dims)[0]!r}, "

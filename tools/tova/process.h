@@ -7,17 +7,17 @@
 
 namespace tova_cli {
 
-// Runs argv[0] (looked up on PATH when it holds no directory separator) with
-// the arguments argv[1...], standard streams inherited, and waits for it.
-// Returns its exit status, or -1 when it could not be started or did not
-// exit normally.
-int runProgram(const std::vector<std::string>& argv);
+// Between the folders of a search path such as PYTHONPATH.
+#ifdef _WIN32
+constexpr char kPathListSeparator = ';';
+#else
+constexpr char kPathListSeparator = ':';
+#endif
 
-// Whether a file exists.
-bool fileExists(const std::string& path);
-
-// Puts dir in front of the path list in the environment variable name
-// (for this process and the programs it starts).
-void prependToPathVariable(const char* name, const std::string& dir);
+// Runs args[0] (looked up on the path when it holds no folder) with the
+// other arguments, the tool's standard streams and extra variables added to
+// its environment ("NAME=value"); waits for it. The program's exit status,
+// or -1 with *error set when it could not be started or was killed.
+int runProgram(const std::vector<std::string>& args, const std::vector<std::string>& environment, std::string* error);
 
 }  // namespace tova_cli

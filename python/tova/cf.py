@@ -444,14 +444,16 @@ def _time_variable(f, meta: dict | None, decode_times: bool):
     return stored.get("name", "time"), var
 
 
-def masked(meta: dict | None, kind: str, number: int) -> bool:
-    """Whether an item's delete values are to become NaN: always, unless a
-    file written from a CF dataset says its variable had no missing values
-    (an integer variable then stays integer)."""
+def masked(meta: dict | None, kind: str, number: int) -> bool | None:
+    """Whether the delete values of an item ("item") or static item
+    ("static") are to become NaN as the file's CF metadata says: True when
+    its variable had missing values or float data, False for an integer
+    variable without them (it then stays integer); None when the file does
+    not say (the reader's own rule applies)."""
     for entry in (meta or {}).get("variables", ()):
         if entry.get("kind") == kind and entry.get("number") == number:
             return bool(entry.get("masked", True))
-    return True
+    return None
 
 
 def decorate(ds, f, *, decode_times: bool = True):

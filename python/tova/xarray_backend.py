@@ -151,7 +151,7 @@ def open_tova_dataset(path, *, mask_and_scale: bool = True, decode_times: bool =
         variables = {}
         meta = cf.metadata_of(f.custom_blocks)
         for index, item in enumerate(f.items):
-            masked = mask_and_scale and cf.masked(meta, "item", item.number)
+            masked = mask_and_scale and cf.masked(meta, "item", item.number) is not False
             dims = ("time",) + grids.dims(item.axis)
             name = _unique(item.name, variables.keys() | grids.coords.keys() | {"time"}, f"{item.name}_{item.number}")
             if name in drop:
@@ -167,7 +167,7 @@ def open_tova_dataset(path, *, mask_and_scale: bool = True, decode_times: bool =
                 name = _unique(item.name, variables.keys() | grids.coords.keys() | {"time"}, f"{item.name}_static")
                 if name in drop:
                     continue
-                masked = mask_and_scale and cf.masked(meta, "static", item.number)
+                masked = mask_and_scale and cf.masked(meta, "static", item.number) is not False
                 values = f.mask_values(item, item.values.copy()) if masked else item.values
                 variables[name] = xr.Variable(dims, values, _item_attrs(f, item, tova_static_item=item.number),
                                               _encoding(f, item, masked))

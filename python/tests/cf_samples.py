@@ -4,8 +4,9 @@ with a grid_mapping variable, a station time series over (station, time), a
 curvilinear lat/lon grid with NaN fill values."""
 
 import numpy as np
+import pytest
 
-netCDF4 = __import__("pytest").importorskip("netCDF4")
+netCDF4 = pytest.importorskip("netCDF4")
 
 FILL = np.float32(1.0e20)
 

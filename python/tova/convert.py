@@ -146,7 +146,7 @@ def main(argv=None) -> int:
         else:
             _netcdf_to_grd(args.input, args.output, {"units": units, "skip_unmappable": args.skip_unmappable},
                            progress)
-    except (TovaError, OSError, ValueError, TypeError, RuntimeError) as exc:
+    except (TovaError, OSError, ValueError, TypeError, KeyError, RuntimeError) as exc:
         progress.close()
         if os.path.exists(args.output):
             os.remove(args.output)

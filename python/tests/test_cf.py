@@ -138,3 +138,17 @@ def test_dask_dataset_and_accessor(tmp_path):
         ds.tova.to_grd(tmp_path / "copy.grd")
         with xr.open_dataset(tmp_path / "copy.grd", engine=TovaBackendEntrypoint) as copy:
             xr.testing.assert_identical(ds.load(), copy)
+
+
+
+@pytest.mark.filterwarnings("ignore:.*CF metadata left aside")
+@pytest.mark.parametrize("meta", ["{not json", '{"version": 1, "variables": 5}',
+                                  '{"version": 1, "variables": [{"name": "a", "kind": "item", "number": 1, '
+                                  '"dims": ["t", "q", "r"]}]}'])
+def test_metadata_that_does_not_fit_is_left_aside(meta, tmp_path):
+    path = tmp_path / "h.grd"
+    with tova.create(path, [tova.Item("a", "WaterLevel", "m", np.float32, tova.Axis.equidistant([2]))],
+                     tova.TimeAxis.equidistant(1.0), custom_blocks={"CF_METADATA": meta}) as w:
+        w.append([np.array([1.0, 2.0], np.float32)])
+    with xr.open_dataset(path, engine=TovaBackendEntrypoint) as ds:
+        np.testing.assert_array_equal(ds.a.values, [[1.0, 2.0]])

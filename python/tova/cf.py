@@ -311,6 +311,10 @@ def metadata_of(custom_blocks) -> dict | None:
             arrays[block.name[len(ARRAY_BLOCK_PREFIX):]] = block.values
     if not isinstance(meta, dict) or meta.get("version") != _META_VERSION:
         return None
+    variables, time, attrs = meta.get("variables", []), meta.get("time"), meta.get("attrs", {})
+    if not (isinstance(variables, list) and all(isinstance(e, dict) for e in variables)
+            and isinstance(time, (dict, type(None))) and isinstance(attrs, dict)):
+        return None  # not what this package writes: the file is read without it
     meta["arrays"] = arrays
     return meta
 
@@ -467,7 +471,7 @@ def decorate(ds, f, *, decode_times: bool = True):
         try:
             time_name, time = _time_variable(f, meta, decode_times)
             return _restore(ds, meta, time_name, time, decode_times)
-        except (ValueError, KeyError, TypeError, IndexError) as exc:
+        except (ValueError, KeyError, TypeError, IndexError, AttributeError) as exc:
             # Metadata that no longer fits the file (a file changed by other
             # writers since): the file as it is.
             warnings.warn(f"{f.path}: CF metadata left aside, it does not fit the file ({exc})", stacklevel=2)

@@ -153,20 +153,19 @@ def open_tova_dataset(path, *, mask_and_scale: bool = True, decode_times: bool =
             name = _unique(item.name, variables.keys() | grids.coords.keys() | {"time"}, f"{item.name}_{item.number}")
             if name in drop:
                 continue
-            dtype = f.masked_dtype(item) if mask_and_scale else item.dtype
-            lazy = indexing.LazilyIndexedArray(
-                TovaBackendArray(manager, index, (f.n_steps,) + item.shape, dtype, mask_and_scale))
-            variables[name] = xr.Variable(dims, lazy, _item_attrs(f, item, tova_item=item.number),
-                                          _encoding(f, item, mask_and_scale))
+            lazy = indexing.LazilyIndexedArray(TovaBackendArray(manager, index, (f.n_steps,) + item.shape,
+                                                                item.dtype, _masks(item, mask_and_scale)))
+            variables[name] = xr.Variable(dims, lazy, *_attrs_and_encoding(f, item, mask_and_scale,
+                                                                            tova_item=item.number))
         if static_items:
             for item in f.static_items:
                 dims = grids.dims(item.axis)
                 name = _unique(item.name, variables.keys() | grids.coords.keys() | {"time"}, f"{item.name}_static")
                 if name in drop:
                     continue
-                values = f.mask_values(item, item.values.copy()) if mask_and_scale else item.values
-                variables[name] = xr.Variable(dims, values, _item_attrs(f, item, tova_static_item=item.number),
-                                              _encoding(f, item, mask_and_scale))
+                values = f.mask_values(item, item.values.copy()) if _masks(item, mask_and_scale) else item.values
+                variables[name] = xr.Variable(dims, values, *_attrs_and_encoding(f, item, mask_and_scale,
+                                                                                  tova_static_item=item.number))
         coords.update(grids.coords)
         ds = xr.Dataset(variables, coords={k: v for k, v in coords.items() if k not in drop},
                         attrs=_global_attrs(f))
@@ -177,23 +176,34 @@ def open_tova_dataset(path, *, mask_and_scale: bool = True, decode_times: bool =
     return ds
 
 
+def _masks(item, mask_and_scale: bool) -> bool:
+    """Whether an item's delete values become NaN: float items only. Integer
+    items keep their type and values, the delete value as ``_FillValue``."""
+    return mask_and_scale and item.dtype.kind == "f"
+
+
 def _item_attrs(f: GridFile, item, **number) -> dict:
     return {"long_name": item.name, "units": item.unit_name, "quantity": item.quantity_name,
             "axis_kind": item.axis.name, "value_type": item.value_type, **number}
 
 
-def _encoding(f: GridFile, item, masked: bool) -> dict:
+def _attrs_and_encoding(f: GridFile, item, mask_and_scale: bool, **number) -> tuple:
+    """The attributes and encoding of an item's variable. The delete value
+    is the ``_FillValue``: in the encoding where it became NaN, else (values
+    as stored) in the attributes, where ``xr.decode_cf`` finds it."""
+    attrs, encoding = _item_attrs(f, item, **number), {"dtype": item.dtype}
     marker = f.delete_values.for_dtype(item.dtype)
-    if not masked or marker is None:
-        return {"dtype": item.dtype}
-    return {"dtype": item.dtype, "_FillValue": marker}
+    if marker is not None:
+        (encoding if _masks(item, mask_and_scale) else attrs)["_FillValue"] = marker
+    return attrs, encoding
 
 
 class TovaBackendEntrypoint(BackendEntrypoint):
     """``engine="tova"``: gridded data files of the modelling suite.
 
-    Options: ``mask_and_scale`` (default True: delete values become NaN;
-    integer items then come as float64), ``decode_times`` (default True:
+    Options: ``mask_and_scale`` (default True: delete values of float items
+    become NaN; integer items keep their type, with the delete value as
+    ``_FillValue``), ``decode_times`` (default True:
     calendar axes as datetime64), ``static_items`` (default True: static
     items as variables without time), ``drop_variables``."""
 

@@ -73,9 +73,12 @@ def build_libraries() -> dict:
             configure += ["-DCMAKE_C_COMPILER_LAUNCHER=ccache", "-DCMAKE_CXX_COMPILER_LAUNCHER=ccache"]
     configure += shlex.split(os.environ.get("TOVA_CMAKE_ARGS", ""))
     jobs = os.environ.get("CMAKE_BUILD_PARALLEL_LEVEL") or str(os.cpu_count() or 2)
-    subprocess.run(configure, check=True)
+    # Paths inside the tree are hashed relative to it: a copy of the tree
+    # elsewhere finds the compiler cache's results of this one.
+    env = {"CCACHE_BASEDIR": str(ROOT), **os.environ}
+    subprocess.run(configure, check=True, env=env)
     subprocess.run(["cmake", "--build", str(BUILD_DIR), "--config", "Release", "--parallel", jobs,
-                    "--target", "tova", "qty"], check=True)
+                    "--target", "tova", "qty"], check=True, env=env)
     return _shared_libraries(BUILD_DIR / "src")
 
 

@@ -1,0 +1,176 @@
+#!/usr/bin/env python3
+"""Reads through the Python package, against numpy reading the same bytes.
+
+    /usr/bin/python3 bench/python_read.py [--repeats N] [--dir DIR] [--no-write]
+
+Workload W1: a gridded data file of 3 float items of 1000 x 1000 over 100
+time steps (1.2 GB), written into a temporary folder (DIR, default the
+system's) and deleted afterwards; an ensemble of 8 files of the same items
+over 12 time steps each. Every read comes from the page cache (the files
+were just written). Measured, as the median of N rounds (default 5):
+
+1. `np.fromfile` of the whole W1 file, the limit;
+2. `xr.open_dataset(W1, engine="tova").load()` with the default masking
+   (delete values to NaN) and with `mask_and_scale=False`;
+3. dask, `chunks={"time": 1}`, every item summed with the threaded
+   scheduler on 1 and on 2 threads;
+4. the ensemble opened with `xr.open_mfdataset(parallel=True)` and every
+   item summed on a `dask.distributed` LocalCluster of 1 and of 2 worker
+   processes (one thread each).
+
+The table goes to the section "Python package reads" of bench/RESULTS.md
+(replaced when there; `bench/run` keeps it), unless --no-write.
+"""
+
+from __future__ import annotations
+
+import argparse
+import os
+import platform
+import shutil
+import statistics
+import subprocess
+import sys
+import tempfile
+import time
+from pathlib import Path
+
+import numpy as np
+
+ROOT = Path(__file__).resolve().parents[1]
+sys.path.insert(0, str(ROOT / "python"))
+
+import dask  # noqa: E402
+import xarray as xr  # noqa: E402
+
+import tova  # noqa: E402
+from tova.xarray_backend import TovaBackendEntrypoint as ENGINE  # noqa: E402
+
+SECTION = "## Python package reads"
+ITEMS = ("u", "v", "level")
+SHAPE = (1000, 1000)
+
+
+def write(path: Path, steps: int, seed: int) -> None:
+    """3 float items of 1000 x 1000 with 2 % delete values, `steps` steps."""
+    grid = tova.Axis.equidistant(SHAPE[::-1])
+    items = [tova.Item(name, "WaterLevel", "m", np.float32, grid) for name in ITEMS]
+    rng = np.random.default_rng(seed)
+    base = rng.random(SHAPE, dtype=np.float32)
+    land = rng.random(SHAPE) < 0.02
+    with tova.create(path, items, tova.TimeAxis.equidistant(600.0), stats_type=1) as w:
+        for t in range(steps):
+            values = base + np.float32(t)
+            values[land] = tova.units.DELETE_VALUE_FLOAT
+            w.append([values, values, values])
+
+
+def median_time(action, repeats: int) -> float:
+    times = []
+    for _ in range(repeats):
+        start = time.perf_counter()
+        action()
+        times.append(time.perf_counter() - start)
+    return statistics.median(times)
+
+
+def sum_items(ds, **compute):
+    return dask.compute(*[ds[name].data.sum() for name in ITEMS], **compute)
+
+
+def measure(folder: Path, repeats: int) -> list:
+    w1 = folder / "w1.grd"
+    write(w1, 100, 1)
+    size = w1.stat().st_size
+    rows = []
+
+    fromfile = median_time(lambda: np.fromfile(w1, dtype=np.uint8), repeats)
+    rows.append(("np.fromfile of the whole file", fromfile, "1.00x (the limit)"))
+
+    def load(**options):
+        with xr.open_dataset(w1, engine=ENGINE, **options) as ds:
+            ds.load()
+
+    masked = median_time(load, repeats)
+    rows.append(("open_dataset(...).load(), delete values to NaN", masked,
+                 f"{fromfile / masked:.2f}x np.fromfile (target >= 0.8x)"))
+    raw = median_time(lambda: load(mask_and_scale=False), repeats)
+    rows.append(("open_dataset(..., mask_and_scale=False).load()", raw, f"{fromfile / raw:.2f}x np.fromfile"))
+
+    with xr.open_dataset(w1, engine=ENGINE, chunks={"time": 1}) as ds:
+        sum_items(ds, scheduler="threads", num_workers=2)  # warm: the file's handle pool is open
+        one = median_time(lambda: sum_items(ds, scheduler="threads", num_workers=1), repeats)
+        two = median_time(lambda: sum_items(ds, scheduler="threads", num_workers=2), repeats)
+    rows.append(("dask threads, chunks={'time': 1}, sum of every item: 1 thread", one, ""))
+    rows.append(("the same, 2 threads", two, f"{one / two:.2f}x 1 thread (target >= 1.7x)"))
+    w1.unlink()
+
+    members = [folder / f"member{k}.grd" for k in range(8)]
+    for k, path in enumerate(members):
+        write(path, 12, 10 + k)
+    ensemble = {}
+    from distributed import Client, LocalCluster
+
+    for workers in (1, 2):
+        with LocalCluster(n_workers=workers, threads_per_worker=1, processes=True, dashboard_address=None,
+                          silence_logs=40) as cluster, Client(cluster):
+
+            def reduce():
+                with xr.open_mfdataset(members, engine=ENGINE, combine="nested", concat_dim="member",
+                                       parallel=True, chunks={"time": 1}) as ens:
+                    sum_items(ens)
+
+            reduce()  # warm: the workers import the package and load the libraries
+            ensemble[workers] = median_time(reduce, repeats)
+    rows.append(("8-member ensemble, open_mfdataset(parallel=True), sum of every item: 1 worker process",
+                 ensemble[1], ""))
+    rows.append(("the same, 2 worker processes", ensemble[2], f"{ensemble[1] / ensemble[2]:.2f}x 1 worker "
+                                                             "(target >= 1.7x)"))
+    return rows, size
+
+
+def report(rows, size: int, repeats: int, load_before: str, load_after: str) -> str:
+    revision = subprocess.run(["git", "-C", str(ROOT), "rev-parse", "--short", "HEAD"], capture_output=True,
+                              text=True).stdout.strip() or "unknown"
+    lines = [SECTION, "",
+             f"- Date: {time.strftime('%Y-%m-%d %H:%M UTC', time.gmtime())}; source {revision}; "
+             f"command `/usr/bin/python3 bench/python_read.py --repeats {repeats}`",
+             f"- Python {platform.python_version()}, numpy {np.__version__}, xarray {xr.__version__}, "
+             f"dask {dask.__version__}; libtova from {tova.library_paths()[0]}",
+             f"- nproc {os.cpu_count()}; load average (1, 5, 15 min) before: {load_before}; after: {load_after}",
+             f"- W1: 3 float items of 1000 x 1000, 100 time steps, {size / 1e9:.2f} GB, read from the page cache; "
+             "ensemble: 8 files of the same items over 12 time steps. Median of "
+             f"{repeats} rounds.", "",
+             "| what | median time | ratio |", "|---|---:|---|"]
+    lines += [f"| {what} | {seconds * 1e3:.0f} ms | {ratio} |" for what, seconds, ratio in rows]
+    return "\n".join(lines) + "\n"
+
+
+def write_section(text: str) -> None:
+    results = ROOT / "bench" / "RESULTS.md"
+    old = results.read_text() if results.exists() else ""
+    kept = old.split(SECTION)[0].rstrip("\n")
+    results.write_text((kept + "\n\n" if kept else "") + text)
+
+
+def main() -> None:
+    parser = argparse.ArgumentParser(description=__doc__.split("\n\n")[0])
+    parser.add_argument("--repeats", type=int, default=5)
+    parser.add_argument("--dir", default=None, help="folder for the temporary data files")
+    parser.add_argument("--no-write", action="store_true", help="print the table only")
+    args = parser.parse_args()
+    load_before = " ".join(Path("/proc/loadavg").read_text().split()[:3]) if Path("/proc/loadavg").exists() else "?"
+    folder = Path(tempfile.mkdtemp(prefix="tova-bench-", dir=args.dir))
+    try:
+        rows, size = measure(folder, args.repeats)
+    finally:
+        shutil.rmtree(folder, ignore_errors=True)
+    load_after = " ".join(Path("/proc/loadavg").read_text().split()[:3]) if Path("/proc/loadavg").exists() else "?"
+    text = report(rows, size, args.repeats, load_before, load_after)
+    print(text)
+    if not args.no_write:
+        write_section(text)
+
+
+if __name__ == "__main__":
+    main()

@@ -58,9 +58,15 @@ def _source_files() -> list[str]:
     return [name for name in listed if name and (ROOT / name).is_file()]
 
 
-def _venv(path: Path) -> Path:
-    _run(PYTHON, "-m", "venv", "--system-site-packages", path)
-    return path / "bin" / "python"
+def _venv(path: Path) -> tuple:
+    """(the environment's interpreter, the command that runs pip for it).
+    The system's pip serves it when there is one (`pip --python`): an
+    environment without its own copy of pip is made ten times as fast."""
+    system_pip = subprocess.run([PYTHON, "-m", "pip", "--python", PYTHON, "--version"], capture_output=True)
+    without = ["--without-pip"] if system_pip.returncode == 0 else []
+    _run(PYTHON, "-m", "venv", "--system-site-packages", *without, path)
+    python = path / "bin" / "python"
+    return python, ([PYTHON, "-m", "pip", "--python", python] if without else [python, "-m", "pip"])
 
 
 @pytest.fixture(scope="module")
@@ -81,10 +87,10 @@ def test_pip_install_and_wheel_from_a_fresh_tree(tmp_path, tools):
     work = tmp_path / "work"
     (work / "tova").mkdir(parents=True)  # a folder named like the package must not shadow it
 
-    first = _venv(tmp_path / "env1")
-    _run(first, "-m", "pip", "install", "-q", "--no-build-isolation", "--no-index", ".", cwd=source)
-    _run(first, "-m", "pip", "wheel", "-q", "--no-build-isolation", "--no-index", "--no-deps", "-w", tmp_path / "dist",
-         ".", cwd=source)
+    first, pip = _venv(tmp_path / "env1")
+    _run(*pip, "install", "-q", "--no-build-isolation", "--no-index", ".", cwd=source)
+    _run(*pip, "wheel", "-q", "--no-build-isolation", "--no-index", "--no-deps", "-w", tmp_path / "dist", ".",
+         cwd=source)
     shutil.rmtree(source)
 
     loaded = _run(first, "-c", CHECK, work / "one.grd", cwd=work).strip()
@@ -93,7 +99,7 @@ def test_pip_install_and_wheel_from_a_fresh_tree(tmp_path, tools):
 
     wheels = list((tmp_path / "dist").glob("tova-*.whl"))
     assert len(wheels) == 1 and "-py3-none-" in wheels[0].name and not wheels[0].name.endswith("-any.whl")
-    second = _venv(tmp_path / "env2")
-    _run(second, "-m", "pip", "install", "-q", "--no-index", wheels[0])
+    second, pip = _venv(tmp_path / "env2")
+    _run(*pip, "install", "-q", "--no-index", wheels[0])
     loaded = _run(second, "-c", CHECK, work / "two.grd", cwd=work).strip()
     assert str(tmp_path / "env2") in loaded

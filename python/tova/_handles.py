@@ -52,7 +52,6 @@ class HandlePool:
     def __init__(self, path: str, first: Handles, reopen: Callable[[], Handles] | None = None,
                  limit: int = DEFAULT_LIMIT):
         self.path = path
-        self._first = first
         self._idle = [first]
         self._count = 1
         self._limit = limit if reopen is not None else 1
@@ -64,36 +63,26 @@ class HandlePool:
     def closed(self) -> bool:
         return self._closed
 
-    @property
-    def first(self) -> Handles:
-        """The pair the file was opened with (its header is the one a writer
-        keeps up to date)."""
-        return self._first
-
     def require_open(self) -> None:
         """Raises the error of a closed file when the pool is closed."""
         if self._closed:
             raise TovaError(F_ERR_ARGUMENT, self.path, "the file is closed")
 
     @contextmanager
-    def use(self, first: bool = False):
+    def use(self):
         """Lends a pair to the calling thread for the block: an idle one, a
         new one while fewer than the limit are open, else the next one given
-        back. ``first`` asks for the pair the file was opened with."""
+        back."""
         handles = None
         with self._ready:
             while handles is None:
                 self.require_open()
-                if first:
-                    if self._first in self._idle:
-                        self._idle.remove(self._first)
-                        handles = self._first
-                elif self._idle:
+                if self._idle:
                     handles = self._idle.pop()
                 elif self._count < self._limit:
                     self._count += 1
                     break
-                if handles is None:
+                else:
                     self._ready.wait()
         if handles is None:  # a new pair, opened outside the lock
             try:

@@ -20,9 +20,9 @@ from __future__ import annotations
 
 import ctypes
 import datetime as _dt
+import functools
 import math
 import operator
-import functools
 import os
 import weakref
 from ctypes import POINTER, byref, c_char_p, c_double, c_float, c_int32, c_void_p
@@ -554,9 +554,9 @@ class _OpenFile:
         self._pool = HandlePool(self.path, handles, reopen)
         self._finalizer = weakref.finalize(self, self._pool.close)
 
-    def _use(self, first: bool = False):
+    def _use(self):
         """A context lending a (lib, header, file) pair to this thread."""
-        return self._pool.use(first)
+        return self._pool.use()
 
     @property
     def closed(self) -> bool:

@@ -14,7 +14,9 @@ axes, the time of each step; static items only when asked for): each
 variable is a lazy array whose indexing reads only the time steps it selects,
 each reached by one jump. With ``chunks`` the arrays become dask arrays whose
 tasks open the file themselves (once per process) and read their own steps,
-so the work spreads over the workers of ``dask.distributed``.
+so the work spreads over the workers of ``dask.distributed``; the threads of
+one process share the open file, whose pool of handles lets them read at
+the same time.
 """
 
 from __future__ import annotations

@@ -2,6 +2,7 @@
 files that cannot be opened as the OSError subclasses Python users know."""
 
 import os
+import pickle
 
 import pytest
 
@@ -53,3 +54,5 @@ def test_files_that_cannot_be_opened_raise_the_familiar_errors(tmp_path):
         err = info.value
         assert isinstance(err, TovaError) and err.status >= 2000 and err.filename.endswith(name)
         assert name in str(err) and err.name in str(err)
+        again = pickle.loads(pickle.dumps(err))  # as a dask worker sends it back
+        assert type(again) is type(err) and str(again) == str(err) and again.errno == err.errno

@@ -76,6 +76,10 @@ class TovaError(Exception):
     def __str__(self) -> str:
         return self.message
 
+    def __reduce__(self):
+        # Rebuilt from its parts, so that it crosses processes (dask workers) whole.
+        return type(self), (self.status, self.context, self.detail)
+
 
 class UnitError(TovaError, ValueError):
     """An unknown quantity or unit, or a unit that does not fit (status 2010

@@ -67,17 +67,21 @@ def write(path: Path, steps: int, seed: int) -> None:
             w.append([values, values, values])
 
 
-def median_time(action, repeats: int) -> tuple:
-    """(wall-clock, CPU time of this process) of an action, medians of
-    `repeats` rounds. On a busy machine CPU time is the steadier of the two
-    for work on one thread; it does not see other processes' work."""
-    wall, cpu = [], []
+def median_times(actions, repeats: int) -> list:
+    """(wall-clock, CPU time of this process) of each action, medians of
+    `repeats` rounds; each round runs every action once, in turn, so that a
+    disturbance of the machine falls on all of them alike. On a busy machine
+    CPU time is the steadier of the two for work on one thread; it does not
+    see other processes' work."""
+    wall = [[] for _ in actions]
+    cpu = [[] for _ in actions]
     for _ in range(repeats):
-        start, start_cpu = time.perf_counter(), time.process_time()
-        action()
-        wall.append(time.perf_counter() - start)
-        cpu.append(time.process_time() - start_cpu)
-    return statistics.median(wall), statistics.median(cpu)
+        for k, action in enumerate(actions):
+            start, start_cpu = time.perf_counter(), time.process_time()
+            action()
+            wall[k].append(time.perf_counter() - start)
+            cpu[k].append(time.process_time() - start_cpu)
+    return [(statistics.median(w), statistics.median(c)) for w, c in zip(wall, cpu)]
 
 
 def sum_items(ds, **compute):
@@ -87,29 +91,29 @@ def sum_items(ds, **compute):
 def measure(folder: Path, repeats: int) -> list:
     w1 = folder / "w1.grd"
     write(w1, 100, 1)
+    os.sync()  # no write-back of the new file while it is measured
     size = w1.stat().st_size
     rows = []
 
-    fromfile = median_time(lambda: np.fromfile(w1, dtype=np.uint8), repeats)
+    def load(**options):
+        with xr.open_dataset(w1, engine=ENGINE, **options) as ds:
+            ds.load()
+
+    fromfile, masked, raw = median_times([lambda: np.fromfile(w1, dtype=np.uint8), load,
+                                          lambda: load(mask_and_scale=False)], repeats)
     rows.append(("np.fromfile of the whole file", fromfile, "1.00x (the limit)"))
 
     def versus(other, what, target=""):
         return (f"{fromfile[0] / other[0]:.2f}x {what} (CPU time: {fromfile[1] / other[1]:.2f}x)"
                 + (f" (target >= {target})" if target else ""))
 
-    def load(**options):
-        with xr.open_dataset(w1, engine=ENGINE, **options) as ds:
-            ds.load()
-
-    masked = median_time(load, repeats)
     rows.append(("open_dataset(...).load(), delete values to NaN", masked, versus(masked, "np.fromfile", "0.8x")))
-    raw = median_time(lambda: load(mask_and_scale=False), repeats)
     rows.append(("open_dataset(..., mask_and_scale=False).load()", raw, versus(raw, "np.fromfile")))
 
     with xr.open_dataset(w1, engine=ENGINE, chunks={"time": 1}) as ds:
         sum_items(ds, scheduler="threads", num_workers=2)  # warm: the file's handle pool is open
-        one = median_time(lambda: sum_items(ds, scheduler="threads", num_workers=1), repeats)
-        two = median_time(lambda: sum_items(ds, scheduler="threads", num_workers=2), repeats)
+        one, two = median_times([lambda: sum_items(ds, scheduler="threads", num_workers=1),
+                                 lambda: sum_items(ds, scheduler="threads", num_workers=2)], repeats)
     rows.append(("dask threads, chunks={'time': 1}, sum of every item: 1 thread", one, ""))
     rows.append(("the same, 2 threads", two, f"{one[0] / two[0]:.2f}x 1 thread (target >= 1.7x)"))
     w1.unlink()
@@ -117,20 +121,33 @@ def measure(folder: Path, repeats: int) -> list:
     members = [folder / f"member{k}.grd" for k in range(8)]
     for k, path in enumerate(members):
         write(path, 12, 10 + k)
-    ensemble = {}
+    os.sync()
     from distributed import Client, LocalCluster
 
-    for workers in (1, 2):
-        with LocalCluster(n_workers=workers, threads_per_worker=1, processes=True, dashboard_address=None,
-                          silence_logs=40) as cluster, Client(cluster):
+    def reduce():
+        with xr.open_mfdataset(members, engine=ENGINE, combine="nested", concat_dim="member", parallel=True,
+                               chunks={"time": 1}) as ens:
+            sum_items(ens)
 
-            def reduce():
-                with xr.open_mfdataset(members, engine=ENGINE, combine="nested", concat_dim="member",
-                                       parallel=True, chunks={"time": 1}) as ens:
-                    sum_items(ens)
+    # Both clusters live through the whole measurement and take turns (an
+    # idle cluster costs next to nothing).
+    clusters = [LocalCluster(n_workers=n, threads_per_worker=1, processes=True, dashboard_address=":0",
+                             silence_logs=40) for n in (1, 2)]
+    clients = [Client(cluster, set_as_default=False) for cluster in clusters]
+    try:
+        def on(client):
+            def run():
+                with dask.config.set(scheduler=client):
+                    reduce()
+            return run
 
-            reduce()  # warm: the workers import the package and load the libraries
-            ensemble[workers] = median_time(reduce, repeats)
+        runs = [on(client) for client in clients]
+        for run in runs:  # warm: the workers import the package and load the libraries
+            run()
+        ensemble = dict(zip((1, 2), median_times(runs, repeats)))
+    finally:
+        for closing in clients + clusters:
+            closing.close()
     rows.append(("8-member ensemble, open_mfdataset(parallel=True), sum of every item: 1 worker process",
                  ensemble[1], ""))
     rows.append(("the same, 2 worker processes", ensemble[2], f"{ensemble[1][0] / ensemble[2][0]:.2f}x 1 worker "

@@ -170,6 +170,14 @@ def report(rows, size: int, repeats: int, load_before: str, load_after: str) -> 
              f"{repeats} rounds.", "",
              "| what | median time | CPU time of this process | ratio |", "|---|---:|---:|---|"]
     lines += [f"| {what} | {wall * 1e3:.0f} ms | {cpu * 1e3:.0f} ms | {ratio} |" for what, (wall, cpu), ratio in rows]
+    busy = max(float(load_before.split()[0]), float(load_after.split()[0])) if load_before[0].isdigit() else 0.0
+    if busy > (os.cpu_count() or 1):
+        share = statistics.median(cpu / wall for _, (wall, cpu), _ in rows[:3])
+        lines += ["", f"**The machine was busy** (load average {busy:.1f} on {os.cpu_count()} processors): this "
+                  f"process got about {share:.2f} of a processor (CPU time / wall time of the single-threaded "
+                  "reads). The CPU-time ratios are the steadier comparison of those reads; thread and "
+                  "process scaling cannot show on a machine with no idle processor to spread over, so the "
+                  "2-thread and 2-process figures of such a run say nothing about the package."]
     return "\n".join(lines) + "\n"
 
 

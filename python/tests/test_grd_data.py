@@ -5,6 +5,7 @@ import gc
 import json
 import shutil
 import subprocess
+from concurrent.futures import ThreadPoolExecutor
 from pathlib import Path
 
 import numpy as np
@@ -204,3 +205,46 @@ def test_files_written_here_read_with_the_tool(tmp_path):
         assert name in text
     check = subprocess.run([str(tool), "check", str(path)], capture_output=True, text=True, timeout=60)
     assert check.returncode == 0, check.stdout + check.stderr
+
+
+def test_a_cut_file_names_the_step_and_item_where_its_data_ends(tmp_path):
+    whole = samples.write_equidistant(tmp_path / "whole.grd", n_steps=5)
+    cut = samples.write_equidistant(tmp_path / "cut.grd")
+    with open(cut, "r+b") as stream:  # five whole steps and a few bytes of the sixth
+        stream.truncate(whole.stat().st_size + 10)
+    with tova.open(cut) as f:
+        assert f.n_steps == samples.N_STEPS
+        np.testing.assert_array_equal(f.read("depth", 4), _masked(samples.values(4)["depth"]))
+        for item in ("water_level", "depth"):
+            with pytest.raises(TovaError, match="the data ends in time step 5 at item 1 'water_level'") as err:
+                f.read(item)
+            assert err.value.status >= 2000 and f"item {item!r} of time step 5" in str(err.value)
+
+
+def test_threads_read_one_file_at_once(tmp_path, monkeypatch):
+    """Reads of one open file from several threads overlap on handles of
+    their own and give what one thread reads."""
+    big = tova.Axis.equidistant([300, 300])  # more than one masking block per step
+    path = tmp_path / "big.grd"
+    steps = [np.arange(90000, dtype=np.float32).reshape(300, 300) + t for t in range(8)]
+    holes = [0, 65535, 65536, 89999]
+    for values in steps:
+        values.reshape(-1)[holes] = samples.DELETE_FLOAT
+    with tova.create(path, [Item("level", "WaterLevel", "m", np.float32, big)], TimeAxis.equidistant(1.0)) as w:
+        for values in steps:
+            w.append(values)
+    expected = _masked(np.stack(steps))
+    assert np.isnan(expected.reshape(8, -1)[:, holes]).all()
+    headers = set()
+    position = tova.GridFile._position
+
+    def note_handle(self, lib, h, f, step, number):
+        headers.add(h.value)
+        position(self, lib, h, f, step, number)
+
+    monkeypatch.setattr(tova.GridFile, "_position", note_handle)
+    with tova.open(path) as f, ThreadPoolExecutor(4) as pool:
+        results = list(pool.map(lambda t: f.read("level", slice(t % 8, None)), range(32)))
+        for t, got in enumerate(results):
+            np.testing.assert_array_equal(got, expected[t % 8:])
+    assert 1 < len(headers) <= 4  # the threads read through handles of their own

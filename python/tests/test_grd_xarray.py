@@ -55,9 +55,12 @@ def test_dataset_structure_and_values(sample):
         assert ds.attrs["title"] == "sample" and ds.attrs["time_axis"] == "F_TM_EQ_AXIS"
         assert ds.water_level.encoding["_FillValue"] == samples.DELETE_FLOAT
 
-        for name in ("water_level", "discharge", "flag", "depth"):
+        for name in ("water_level", "discharge", "depth"):
             np.testing.assert_array_equal(ds[name].values, _expected(name), err_msg=name)
-        assert ds.flag.dtype == np.float64
+        # Integer items keep their type and values; the delete value is their _FillValue.
+        assert ds.flag.dtype == np.int32 and ds.flag.attrs["_FillValue"] == 2147483647
+        np.testing.assert_array_equal(ds.flag.values, _expected("flag", False))
+        np.testing.assert_array_equal(xr.decode_cf(ds).flag.values, _expected("flag"))
         np.testing.assert_array_equal(ds.bathymetry, np.arange(12).reshape(3, 4))
         np.testing.assert_array_equal(ds.depth[2:5, 1, ::2].values, _expected("depth")[2:5, 1, ::2])
         np.testing.assert_array_equal(ds.water_level.isel(time=[5, 1], x=[3, 0]).values,
@@ -155,9 +158,9 @@ def test_registered_engine_name(sample, tmp_path):
     # file with engine="tova" in a process that sees it.
     pytest.importorskip("setuptools")
     src, meta = tmp_path / "src", tmp_path / "meta"
-    shutil.copytree(PACKAGE_ROOT / "tova", src / "tova", ignore=shutil.ignore_patterns("__pycache__"))
-    for name in ("pyproject.toml", "README.md"):
-        shutil.copy(PACKAGE_ROOT / name, src / name)
+    shutil.copytree(PACKAGE_ROOT / "tova", src / "python" / "tova", ignore=shutil.ignore_patterns("__pycache__"))
+    for name in ("pyproject.toml", "setup.py", "python/README.md"):
+        shutil.copy(PACKAGE_ROOT.parent / name, src / name)
     meta.mkdir()
     subprocess.run([sys.executable, "-c", f"from setuptools import build_meta; "
                                           f"build_meta.prepare_metadata_for_build_wheel({str(meta)!r})"],
@@ -170,7 +173,7 @@ def test_registered_engine_name(sample, tmp_path):
             print(ds.sizes["time"], float(ds.water_level.isel(time=0, x=0, y=0)))
         print(xr.backends.plugins.guess_engine({str(sample)!r}))
     """)
-    env = {**os.environ, "PYTHONPATH": os.pathsep.join([str(meta), str(src)])}
+    env = {**os.environ, "PYTHONPATH": os.pathsep.join([str(meta), str(src / "python")])}
     out = subprocess.run([sys.executable, "-c", script], env=env, capture_output=True, text=True, timeout=300)
     assert out.returncode == 0, out.stderr
     assert out.stdout.split() == [str(samples.N_STEPS), "0.0", "tova"]

@@ -87,3 +87,13 @@ def test_user_units_are_process_wide_and_convert_both_ways():
         assert info.value.status == 2020
     finally:
         units.set_user_unit("WaterLevel", "m")
+
+
+def test_unknown_names_suggest_the_closest_known_ones():
+    with pytest.raises(UnitError, match=r"unknown unit 'm/sec' \(did you mean 'm/s'"):
+        units.unit("m/sec")
+    with pytest.raises(UnitError, match=r"did you mean 'WaterLevel'"):
+        units.quantity("waterlvel")
+    with pytest.raises(UnitError) as info:
+        units.unit("qqqqqq")
+    assert "did you mean" not in str(info.value)

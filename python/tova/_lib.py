@@ -15,8 +15,10 @@ Where the libraries are looked for, in this order:
 libqty is always taken from the directory libtova comes from, and loaded
 first, so libtova's own dependency resolves to that same copy.
 
-The libraries are loaded on first use, not on import. They are not
-thread-safe: file operations hold ``lock`` while they call into libtova.
+The libraries are loaded on first use, not on import. They keep no hidden
+state shared between files: distinct files may be used on distinct threads
+at once, while each handle is used by one thread at a time (the package's
+file objects hold a lock per handle for that).
 """
 
 from __future__ import annotations
@@ -44,8 +46,8 @@ from pathlib import Path
 
 ENV_VAR = "TOVA_LIBRARY_DIR"
 
-# Serialises calls into libtova, whose process-wide state is unguarded.
-lock = threading.RLock()
+# Guards the first load of the libraries only.
+_load_lock = threading.Lock()
 
 _WINDOWS = sys.platform.startswith("win")
 _MACOS = sys.platform == "darwin"
@@ -272,6 +274,7 @@ _H = c_void_p  # HeaderHandle, FileHandle, ItemHandle, CustomBlockHandle
 TOVA_PROTOTYPES.update({
     "grdHeaderCreate": (i32, [i32, c_char_p, c_char_p, i32, i32, i32, p_handle]),
     "grdHeaderDestroy": (i32, [p_handle]),
+    "grdGetStatusText": (c_char_p, [i32]),
     "grdFileTypeStr": (c_char_p, [i32]),
     "grdTimeAxisTypeStr": (c_char_p, [i32]),
     "grdGetFileType": (i32, [_H]),
@@ -386,7 +389,7 @@ _loaded: tuple[ctypes.CDLL, ctypes.CDLL] | None = None
 
 def _libraries() -> tuple[ctypes.CDLL, ctypes.CDLL]:
     global _loaded
-    with lock:
+    with _load_lock:
         if _loaded is None:
             tova_lib, qty_lib = load()
             declare(qty_lib, QTY_PROTOTYPES)

@@ -20,19 +20,21 @@ from __future__ import annotations
 
 import ctypes
 import datetime as _dt
+import functools
 import math
 import operator
 import os
 import weakref
 from ctypes import POINTER, byref, c_char_p, c_double, c_float, c_int32, c_void_p
 from dataclasses import dataclass
-from functools import cached_property
 from typing import Any, NamedTuple
 
 import numpy as np
 
 from . import _lib, units
-from .errors import F_ERR_ARGUMENT, F_ERR_SIZE, F_ERR_VALUE, TovaError, UnitError, check
+from ._handles import HandlePool, Handles, release
+from ._mask import nan_where_equal
+from .errors import F_ERR_ARGUMENT, F_ERR_SIZE, F_ERR_VALUE, TovaError, UnitError, check, check_open
 
 # Element types by simple-type code; byte data are C chars, signed.
 DTYPES = {1: np.dtype(np.float32), 2: np.dtype(np.float64), 3: np.dtype(np.int8), 4: np.dtype(np.int32),
@@ -64,6 +66,8 @@ _KIND_OF = {(family, dim): code for code, (family, dim, _) in AXIS_KINDS.items()
 DIRECTIONS = ("x", "y", "z", "t")
 _C_FUNCTION = {"equidistant": "Eq", "nonequidistant": "Neq", "curvilinear": "CurveLinear", "time-varying": "Tvar"}
 
+# Statuses of a read that finds less data than the header promises.
+_DATA_MISSING = (2001, 2006, 2009, 2013, 2016, 2019)
 # Positioning results that are no failures of the library's dispatcher.
 F_TIMESTEP_RANGE = 1001
 F_ITEM_RANGE = 1002
@@ -527,17 +531,6 @@ def _custom_blocks_of(lib, header) -> list:
     return blocks
 
 
-def _release(lib, header: c_void_p, file: c_void_p) -> None:
-    """Closes the file and frees the header (each only if still there). A
-    file whose final header update fails is closed by the record layer all
-    the same: the handles never outlive their owner."""
-    with _lib.lock:
-        if file.value and lib.grdFileClose(header, byref(file)) and file.value:
-            lib.rcfFileClose(byref(file))
-        if header.value:
-            lib.grdHeaderDestroy(byref(header))
-
-
 def _index(value, length: int, what: str) -> int:
     i = operator.index(value)
     if not -length <= i < length:
@@ -551,23 +544,23 @@ def _delete_values_of(lib, h) -> DeleteValues:
 
 
 class _OpenFile:
-    """The header and file handles of an open file, released exactly once:
-    by ``close``, on leaving a ``with`` block, or when the object goes."""
+    """The header and file handles of an open file (a ``HandlePool``),
+    released exactly once: by ``close``, on leaving a ``with`` block, or when
+    the object goes. Each handle pair is used by one thread at a time."""
 
     path: str
 
-    def _own(self, lib, header: c_void_p, file: c_void_p) -> None:
-        self._lib, self._header, self._file = lib, header, file
-        self._finalizer = weakref.finalize(self, _release, lib, header, file)
+    def _own(self, handles: Handles, reopen=None) -> None:
+        self._pool = HandlePool(self.path, handles, reopen)
+        self._finalizer = weakref.finalize(self, self._pool.close)
 
-    def _handles(self):
-        if not self._finalizer.alive:
-            raise TovaError(F_ERR_ARGUMENT, self.path, "the file is closed")
-        return self._lib, self._header, self._file
+    def _use(self):
+        """A context lending a (lib, header, file) pair to this thread."""
+        return self._pool.use()
 
     @property
     def closed(self) -> bool:
-        return not self._finalizer.alive
+        return self._pool.closed
 
     def close(self) -> None:
         """Closes the file and frees its header; later calls raise."""
@@ -578,6 +571,19 @@ class _OpenFile:
 
     def __exit__(self, *exc) -> None:
         self.close()
+
+
+def _read_handles(lib, path: str) -> Handles:
+    """A new header and file handle pair of a file opened for reading."""
+    handles = Handles(lib, c_void_p(), c_void_p())
+    status = lib.grdFileRead(_lib.encode(path), byref(handles.header), byref(handles.file))
+    if status:
+        release(handles)
+        check_open(status, path)
+    # Times as stored, and calendar texts as stored: dates are computed
+    # here from the start and the times.
+    lib.grdParamModifyTimes(handles.header, 0)
+    return handles
 
 
 # ---- Reader -------------------------------------------------------------------------
@@ -606,21 +612,13 @@ class GridFile(_OpenFile):
         self.path = os.fspath(path)
         self.mask = mask
         lib = _lib.tova()
-        header, file = c_void_p(), c_void_p()
-        with _lib.lock:
-            status = lib.grdFileRead(_lib.encode(path), byref(header), byref(file))
-            if status:
-                _release(lib, header, file)
-                check(status, self.path)
-            self._own(lib, header, file)
-            try:
-                # Times as stored, and calendar texts as stored: dates are
-                # computed here from the start and the times.
-                lib.grdParamModifyTimes(header, 0)
+        self._own(_read_handles(lib, self.path), functools.partial(_read_handles, lib, self.path))
+        try:
+            with self._use() as (_, header, _):
                 self._load_header(lib, header)
-            except BaseException:
-                self.close()
-                raise
+        except BaseException:
+            self.close()
+            raise
 
     def _load_header(self, lib, h) -> None:
         self.file_type = lib.grdGetFileType(h)
@@ -668,12 +666,11 @@ class GridFile(_OpenFile):
             raise KeyError(f"{self.path}: no item named {key!r}")
         return self.items[_index(key, len(self.items), "item")]
 
-    @cached_property
+    @functools.cached_property
     def static_items(self) -> list:
         """The static items with their values, in file order."""
-        lib, h, f = self._handles()
         out = []
-        with _lib.lock:
+        with self._use() as (lib, h, f):
             check(lib.grdFindBlockStatic(h, f), self.path)
             status = c_int32()
             while True:
@@ -701,7 +698,7 @@ class GridFile(_OpenFile):
         return self.static_items[_index(key, len(self.static_items), "static item")]
 
     # Time ---------------------------------------------------------------------------
-    @cached_property
+    @functools.cached_property
     def times(self) -> np.ndarray:
         """The time of each step (float64, in the time axis's unit): computed
         for the equidistant axes, read from the file otherwise (one jump and
@@ -720,16 +717,19 @@ class GridFile(_OpenFile):
     def read_times(self, steps) -> np.ndarray:
         """The stored time of each given step; for file types that store no
         times, the step's index."""
-        lib, h, f = self._handles()
+        self._pool.require_open()
         steps = self._steps(steps)[0]
         if self.file_type not in _TIMES_STORED:
             return steps.astype(np.float64)
         out = np.empty(len(steps), dtype=np.float64)
         time = c_double()
-        with _lib.lock:
+        with self._use() as (lib, h, f):
             for k, t in enumerate(steps.tolist()):
-                self._position(lib, h, f, t, 1)
-                check(lib.grdReadItemTimeStep(h, f, byref(time), None), f"{self.path}: time step {t}")
+                try:
+                    self._position(lib, h, f, t, 1)
+                    check(lib.grdReadItemTimeStep(h, f, byref(time), None), f"{self.path}: time step {t}")
+                except TovaError as exc:
+                    raise self._where_data_ends(lib, h, f, t, self.items[0], exc) from exc
                 out[k] = time.value
         return out
 
@@ -758,10 +758,43 @@ class GridFile(_OpenFile):
             raise TovaError(status, self.path, f"cannot position at item {number} of time step {step}")
 
     def _read_into(self, lib, h, f, item: Item, step: int, buffer: np.ndarray) -> None:
-        """Reads one item of one step into a C-contiguous buffer of its size."""
-        self._position(lib, h, f, step, item.number)
-        check(lib.grdReadItemTimeStep(h, f, None, buffer.ctypes.data),
-              f"{self.path}: item {item.name!r} of time step {step}")
+        """Reads one item of one step into a C-contiguous buffer of its size;
+        a file whose data ends too early is named with where it ends."""
+        try:
+            self._position(lib, h, f, step, item.number)
+            check(lib.grdReadItemTimeStep(h, f, None, buffer.ctypes.data),
+                  f"{self.path}: item {item.name!r} of time step {step}")
+        except TovaError as exc:
+            raise self._where_data_ends(lib, h, f, step, item, exc) from exc
+
+    def _readable(self, lib, h, f, position: int) -> bool:
+        """Whether the item at a position (time step times item count plus
+        item index) can be found and read whole."""
+        step, index = divmod(position, len(self.items))
+        item = self.items[index]
+        scratch = np.empty(item.size, dtype=item.dtype)
+        return (lib.grdFindItemDynamic(h, f, step, item.number) == 0
+                and lib.grdReadItemTimeStep(h, f, None, scratch.ctypes.data) == 0)
+
+    def _where_data_ends(self, lib, h, f, step: int, item: Item, exc: TovaError) -> TovaError:
+        """The error of a read that failed at (step, item) as the data of a
+        damaged file: the first item, in file order, that cannot be read,
+        found by halving between the file's start and the failure."""
+        if exc.status not in _DATA_MISSING:
+            return exc
+        low, high = 0, step * len(self.items) + item.number - 1  # high cannot be read
+        while low < high:
+            middle = (low + high) // 2
+            if self._readable(lib, h, f, middle):
+                low = middle + 1
+            else:
+                high = middle
+        end_step, index = divmod(high, len(self.items))
+        ends = self.items[index]
+        return TovaError(exc.status, self.path,
+                         f"the data ends in time step {end_step} at item {ends.number} {ends.name!r}, "
+                         f"although the header counts {self.n_steps} time steps: the file is cut short or damaged "
+                         f"(reading item {item.name!r} of time step {step})")
 
     def masked_dtype(self, item) -> np.dtype:
         """The element type of an item's values once delete values are NaN."""
@@ -778,35 +811,45 @@ class GridFile(_OpenFile):
         marker = self.delete_values.for_dtype(item.dtype)
         if marker is None:
             return values
-        hit = values == marker
         if values.dtype.kind != "f":
+            hit = values == marker
             values = values.astype(np.float64)
-        values[hit] = np.nan
+            values[hit] = np.nan
+            return values
+        if values.flags.c_contiguous and values.flags.writeable:
+            nan_where_equal(values, marker)
+        else:
+            values[values == marker] = np.nan
         return values
 
     def read(self, item, steps=None, *, mask: bool | None = None) -> np.ndarray:
         """The values of an item at the given time steps: an integer step
         gives one array of the item's shape; None (all), a slice or a sequence
         of steps gives an array with the steps first. Each step is one jump
-        and one read straight into the result."""
-        lib, h, f = self._handles()
+        and one read straight into the result; its delete values become NaN
+        while it is fresh in the cache."""
+        self._pool.require_open()
         item = self.item(item)
         indices, single = self._steps(steps)
+        masked = self.mask if mask is None else mask
+        marker = self.delete_values.for_dtype(item.dtype) if masked and item.dtype.kind == "f" else None
         out = np.empty((len(indices),) + item.shape, dtype=item.dtype)
         rows = out.reshape(len(indices), item.size)
-        with _lib.lock:
+        with self._use() as (lib, h, f):
             for k, t in enumerate(indices.tolist()):
                 self._read_into(lib, h, f, item, t, rows[k])
-        if self.mask if mask is None else mask:
+                if marker is not None:
+                    nan_where_equal(rows[k], marker)
+        if masked and marker is None:
             out = self.mask_values(item, out)
         return out[0] if single else out
 
     def read_step(self, step: int, *, mask: bool | None = None) -> dict:
         """Every item of one time step, by name, in one pass."""
-        lib, h, f = self._handles()
+        self._pool.require_open()
         t = _index(step, self.n_steps, "time step")
         out = {}
-        with _lib.lock:
+        with self._use() as (lib, h, f):
             for item in self.items:
                 out[item.name] = values = np.empty(item.shape, dtype=item.dtype)
                 self._read_into(lib, h, f, item, t, values.reshape(item.size))
@@ -818,9 +861,8 @@ class GridFile(_OpenFile):
         """(minimum, maximum, number of delete values) of an item as the
         header keeps them."""
         item = self.item(item)
-        lib, h, _ = self._handles()
         lo, hi, deletes = c_double(), c_double(), c_int32()
-        with _lib.lock:
+        with self._use() as (lib, h, _):
             check(lib.grdGetItemStatsGlobal(lib.grdItemD(h, item.number), byref(lo), byref(hi), byref(deletes)),
                   self.path)
         return lo.value, hi.value, deletes.value
@@ -937,28 +979,28 @@ class GridWriter(_OpenFile):
         self._failure: TovaError | None = None
 
         lib = _lib.tova()
-        header, file = c_void_p(), c_void_p()
-        with _lib.lock:
-            self._own(lib, header, file)
-            try:
-                check(lib.grdHeaderCreate(file_type, _lib.encode(title), _lib.encode(app_title), app_version,
-                                          len(self.items), stats_type, byref(header)), self.path)
-                self._fill_header(lib, header, data_type, projection, delete_values, blocks)
-                if keys:
-                    pointers = [_lib.as_pointer(k, c_int32) if k is not None else None for k in keys]
-                    check(lib.grdSetEncodeKey(header, *pointers, len(keys[0])), self.path)
-                check(lib.grdFileCreate(_lib.encode(path), header, byref(file)), self.path)
-                for item, values in statics:
-                    self._write_static(lib, item, values)
-            except BaseException:
-                created = bool(file.value)
-                self._finalizer()
-                if created:  # a failed create leaves no half-made file behind
-                    try:
-                        os.remove(self.path)
-                    except OSError:
-                        pass
-                raise
+        handles = Handles(lib, c_void_p(), c_void_p())
+        header, file = handles.header, handles.file
+        self._own(handles)  # one pair: a file being written is never reopened
+        try:
+            check(lib.grdHeaderCreate(file_type, _lib.encode(title), _lib.encode(app_title), app_version,
+                                      len(self.items), stats_type, byref(header)), self.path)
+            self._fill_header(lib, header, data_type, projection, delete_values, blocks)
+            if keys:
+                pointers = [_lib.as_pointer(k, c_int32) if k is not None else None for k in keys]
+                check(lib.grdSetEncodeKey(header, *pointers, len(keys[0])), self.path)
+            check_open(lib.grdFileCreate(_lib.encode(path), header, byref(file)), self.path, writing=True)
+            for item, values in statics:
+                self._write_static(handles, item, values)
+        except BaseException:
+            created = bool(file.value)
+            self._finalizer()
+            if created:  # a failed create leaves no half-made file behind
+                try:
+                    os.remove(self.path)
+                except OSError:
+                    pass
+            raise
 
     def _keys(self, keys) -> list | None:
         """The x, y and z encoding keys (the z key, or the y and z keys, may
@@ -1003,15 +1045,16 @@ class GridWriter(_OpenFile):
             _set_item(lib, h, lib.grdItemD(h, item.number), item, f"{self.path}: item {item.name!r}")
         self.delete_values = _delete_values_of(lib, h)
 
-    def _write_static(self, lib, item: StaticItem, values: np.ndarray) -> None:
+    def _write_static(self, handles: Handles, item: StaticItem, values: np.ndarray) -> None:
+        lib, header, file = handles
         what = f"{self.path}: static item {item.name!r}"
         handle = c_void_p()
         check(lib.grdStaticCreate(byref(handle)), what)
         try:
-            check(lib.grdStaticSetHeader(self._header, handle), what)
-            _set_item(lib, self._header, handle, item, what)
+            check(lib.grdStaticSetHeader(header, handle), what)
+            _set_item(lib, header, handle, item, what)
             values = _nan_as_delete(values, item.values, self.delete_values.for_dtype(item.dtype))
-            check(lib.grdStaticWrite(handle, self._file, values.ctypes.data), what)
+            check(lib.grdStaticWrite(handle, file, values.ctypes.data), what)
         finally:
             lib.grdStaticDestroy(byref(handle))
 
@@ -1020,9 +1063,8 @@ class GridWriter(_OpenFile):
         if self.steps_written:
             raise TovaError(F_ERR_ARGUMENT, self.path, "static items go before the first time step")
         values = _values(item.values, item, f"{self.path}: static item {item.name!r}")
-        lib, _, _ = self._handles()
-        with _lib.lock:
-            self._write_static(lib, item, values)
+        with self._use() as handles:
+            self._write_static(handles, item, values)
 
     def _time(self, time) -> float:
         axis = self.time_axis
@@ -1056,10 +1098,9 @@ class GridWriter(_OpenFile):
                                  self.delete_values.for_dtype(it.dtype))
                   for v, it in zip(values, self.items)]
         t = self._time(time)
-        lib, h, f = self._handles()
         if self._failure is not None:
             raise TovaError(self._failure.status, self.path, f"an earlier time step failed: {self._failure}")
-        with _lib.lock:
+        with self._use() as (lib, h, f):
             for item, array in zip(self.items, arrays):
                 status = lib.grdWriteItemTimeStep(h, f, t, array.ctypes.data)
                 if status:
@@ -1070,21 +1111,19 @@ class GridWriter(_OpenFile):
 
     def flush(self) -> None:
         """Brings the header on disk up to date (at most once a second)."""
-        lib, h, f = self._handles()
-        with _lib.lock:
+        with self._use() as (lib, h, f):
             check(lib.grdFileFlush(h, f), self.path)
 
     def close(self) -> None:
         """Rewrites the header and closes the file. When the final header
         update fails the error is raised and the handles are released."""
-        if not self._finalizer.alive:
+        if self.closed:
             return
-        lib, h, f = self._lib, self._header, self._file
-        with _lib.lock:
-            try:
+        try:
+            with self._use() as (lib, h, f):
                 check(lib.grdFileClose(h, byref(f)), self.path)
-            finally:
-                self._finalizer()
+        finally:
+            self._finalizer()
 
 
 def create(path: str | os.PathLike, items, time_axis: TimeAxis, **options) -> GridWriter:

@@ -10,6 +10,7 @@ they are (NaN stays NaN anyway).
 
 from __future__ import annotations
 
+import difflib
 import operator
 from ctypes import byref, c_char_p, c_double, c_float, c_int32
 from typing import NamedTuple, Union
@@ -62,14 +63,26 @@ def _text_out(fn, key: int) -> str | None:
     return _lib.decode(text.value) if fn(key, byref(text)) else None
 
 
-def _lookup(value, cls, by_text, by_key, describe, what: str):
-    """A Quantity or Unit from a key, a text or an object of its class."""
+def _suggestions(text, known) -> str:
+    """" (did you mean 'a', 'b'?)" for the known names closest to a text
+    (letter case ignored), or "" when none is close."""
+    text = text.decode("utf-8", "replace") if isinstance(text, bytes) else text
+    by_folded = {}
+    for entry in known:
+        by_folded.setdefault(entry.name.casefold(), entry.name)
+    close = difflib.get_close_matches(text.casefold(), list(by_folded), n=3, cutoff=0.6)
+    return f" (did you mean {', '.join(repr(by_folded[c]) for c in close)}?)" if close else ""
+
+
+def _lookup(value, cls, by_text, by_key, describe, what: str, known):
+    """A Quantity or Unit from a key, a text or an object of its class;
+    ``known`` lists every one, for suggestions when a text is unknown."""
     if isinstance(value, cls):
         return value
     if isinstance(value, (str, bytes)):
         key = c_int32()
         if not by_text(_lib.encode(value), byref(key)):
-            raise UnitError(F_ERR_VALUE, detail=f"unknown {what} {value!r}")
+            raise UnitError(F_ERR_VALUE, detail=f"unknown {what} {value!r}{_suggestions(value, known())}")
         k = key.value
     else:
         k = operator.index(value)
@@ -84,14 +97,14 @@ def quantity(q: QuantityLike) -> Quantity:
     that is unambiguous) or a Quantity. Raises UnitError when unknown."""
     lib = _lib.qty()
     return _lookup(q, Quantity, lib.qtyGetItemTypeTag, lib.qtyGetItemTypeKey, lib.qtyGetItemTypeDescription,
-                   "quantity")
+                   "quantity", quantities)
 
 
 def unit(u: UnitLike) -> Unit:
     """The unit of a key, a text (symbol or alias) or a Unit. Raises
     UnitError when unknown."""
     lib = _lib.qty()
-    return _lookup(u, Unit, lib.qtyGetUnitTag, lib.qtyGetUnitKey, lib.qtyGetUnitDescription, "unit")
+    return _lookup(u, Unit, lib.qtyGetUnitTag, lib.qtyGetUnitKey, lib.qtyGetUnitDescription, "unit", all_units)
 
 
 def _entries(count: int, by_index, make) -> list:

@@ -22,7 +22,7 @@ from dataclasses import dataclass, field
 import numpy as np
 
 from . import _lib, units
-from .errors import F_ERR_MEMORY, F_ERR_SIZE, F_ERR_VALUE, VRE_NOT_SET, TovaError, check
+from .errors import F_ERR_MEMORY, F_ERR_SIZE, F_ERR_VALUE, VRE_NOT_SET, TovaError, check, check_open
 
 VECTOR_ITEMS = 23
 SCALAR_ITEMS = 2
@@ -153,19 +153,15 @@ def _from_handle(lib, handle) -> Vre:
 
 
 class _Handle:
-    """A VreHandle freed on leaving the block; holds the library lock."""
+    """A VreHandle of this thread alone, freed on leaving the block."""
 
     def __enter__(self):
         self.lib = _lib.tova()
         self.handle = _lib.VreHandle()
-        _lib.lock.acquire()
         return self
 
     def __exit__(self, *exc):
-        try:
-            self.lib.vreHandleFree(self.handle)
-        finally:
-            _lib.lock.release()
+        self.lib.vreHandleFree(self.handle)
 
 
 def read(path: str | os.PathLike) -> Vre:
@@ -173,7 +169,7 @@ def read(path: str | os.PathLike) -> Vre:
     a VRE file. Values are in each item's storage unit."""
     name = os.fspath(path)
     with _Handle() as h:
-        check(h.lib.vreFileRead(_lib.encode(path), byref(h.handle)), name)
+        check_open(h.lib.vreFileRead(_lib.encode(path), byref(h.handle)), name)
         # Every file holds B panel counts of 4 bytes: a larger body count
         # comes from a damaged file and would only make huge zero buffers.
         bodies = h.lib.vreGetVectorParam(h.handle, 1)
@@ -263,7 +259,7 @@ def write(path: str | os.PathLike, vre: Vre) -> None:
         if not h.handle:
             raise TovaError(F_ERR_MEMORY, "vreHandleCreate")
         _fill(h.lib, h.handle, vre)
-        check(h.lib.vreFileWrite(_lib.encode(path), h.handle), os.fspath(path))
+        check_open(h.lib.vreFileWrite(_lib.encode(path), h.handle), path, writing=True)
 
 
 __all__ = ["DELETE_VALUE", "Vre", "VreItem", "new", "read", "write"]

@@ -14,7 +14,9 @@ axes, the time of each step; static items only when asked for): each
 variable is a lazy array whose indexing reads only the time steps it selects,
 each reached by one jump. With ``chunks`` the arrays become dask arrays whose
 tasks open the file themselves (once per process) and read their own steps,
-so the work spreads over the workers of ``dask.distributed``.
+so the work spreads over the workers of ``dask.distributed``; the threads of
+one process share the open file, whose pool of handles lets them read at
+the same time.
 """
 
 from __future__ import annotations
@@ -151,7 +153,7 @@ def open_tova_dataset(path, *, mask_and_scale: bool = True, decode_times: bool =
         variables = {}
         meta = cf.metadata_of(f.custom_blocks)
         for index, item in enumerate(f.items):
-            masked = mask_and_scale and cf.masked(meta, "item", item.number) is not False
+            masked = _masks(item, mask_and_scale, cf.masked(meta, "item", item.number))
             dims = ("time",) + grids.dims(item.axis)
             name = _unique(item.name, variables.keys() | grids.coords.keys() | {"time"}, f"{item.name}_{item.number}")
             if name in drop:
@@ -159,18 +161,17 @@ def open_tova_dataset(path, *, mask_and_scale: bool = True, decode_times: bool =
             dtype = f.masked_dtype(item) if masked else item.dtype
             lazy = indexing.LazilyIndexedArray(
                 TovaBackendArray(manager, index, (f.n_steps,) + item.shape, dtype, masked))
-            variables[name] = xr.Variable(dims, lazy, _item_attrs(f, item, tova_item=item.number),
-                                          _encoding(f, item, masked))
+            variables[name] = xr.Variable(dims, lazy, *_attrs_and_encoding(f, item, masked, tova_item=item.number))
         if static_items:
             for item in f.static_items:
                 dims = grids.dims(item.axis)
                 name = _unique(item.name, variables.keys() | grids.coords.keys() | {"time"}, f"{item.name}_static")
                 if name in drop:
                     continue
-                masked = mask_and_scale and cf.masked(meta, "static", item.number) is not False
+                masked = _masks(item, mask_and_scale, cf.masked(meta, "static", item.number))
                 values = f.mask_values(item, item.values.copy()) if masked else item.values
-                variables[name] = xr.Variable(dims, values, _item_attrs(f, item, tova_static_item=item.number),
-                                              _encoding(f, item, masked))
+                variables[name] = xr.Variable(dims, values, *_attrs_and_encoding(f, item, masked,
+                                                                                  tova_static_item=item.number))
         coords.update(grids.coords)
         ds = xr.Dataset(variables, coords={k: v for k, v in coords.items() if k not in drop},
                         attrs=_global_attrs(f))
@@ -182,23 +183,39 @@ def open_tova_dataset(path, *, mask_and_scale: bool = True, decode_times: bool =
     return ds
 
 
+def _masks(item, mask_and_scale: bool, cf_says: bool | None = None) -> bool:
+    """Whether an item's delete values become NaN. The file's CF metadata
+    decides where it says (an integer variable that had missing values in
+    its netCDF source comes back as float with NaN, as xarray reads it from
+    netCDF); otherwise float items only: integer items keep their type and
+    values, the delete value as ``_FillValue``."""
+    if not mask_and_scale:
+        return False
+    return cf_says if cf_says is not None else item.dtype.kind == "f"
+
+
 def _item_attrs(f: GridFile, item, **number) -> dict:
     return {"long_name": item.name, "units": item.unit_name, "quantity": item.quantity_name,
             "axis_kind": item.axis.name, "value_type": item.value_type, **number}
 
 
-def _encoding(f: GridFile, item, masked: bool) -> dict:
+def _attrs_and_encoding(f: GridFile, item, masked: bool, **number) -> tuple:
+    """The attributes and encoding of an item's variable. The delete value
+    is the ``_FillValue``: in the encoding where it became NaN, else (values
+    as stored) in the attributes, where ``xr.decode_cf`` finds it."""
+    attrs, encoding = _item_attrs(f, item, **number), {"dtype": item.dtype}
     marker = f.delete_values.for_dtype(item.dtype)
-    if not masked or marker is None:
-        return {"dtype": item.dtype}
-    return {"dtype": item.dtype, "_FillValue": marker}
+    if marker is not None:
+        (encoding if masked else attrs)["_FillValue"] = marker
+    return attrs, encoding
 
 
 class TovaBackendEntrypoint(BackendEntrypoint):
     """``engine="tova"``: gridded data files of the modelling suite.
 
-    Options: ``mask_and_scale`` (default True: delete values become NaN;
-    integer items then come as float64), ``decode_times`` (default True:
+    Options: ``mask_and_scale`` (default True: delete values of float items
+    become NaN; integer items keep their type, with the delete value as
+    ``_FillValue``), ``decode_times`` (default True:
     calendar axes as datetime64), ``static_items`` (default True: static
     items as variables without time), ``drop_variables``."""
 

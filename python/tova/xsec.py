@@ -28,7 +28,7 @@ import numpy as np
 
 from . import _lib
 from ._lib import XsecData
-from .errors import F_ERR_MEMORY, F_ERR_SIZE, F_ERR_VALUE, TovaError, check
+from .errors import F_ERR_MEMORY, F_ERR_SIZE, F_ERR_VALUE, TovaError, check, check_open
 
 LOAD_KEYS_ONLY = 0x1
 MAX_ENTRIES = 0xFFFF
@@ -108,7 +108,7 @@ class _Table:
 
     def __init__(self, lib, path, flags: int):
         self.lib, self.table = lib, c_void_p()
-        check(lib.xfsXsecTableLoad(_lib.encode(path), byref(self.table), flags), os.fspath(path))
+        check_open(lib.xfsXsecTableLoad(_lib.encode(path), byref(self.table), flags), path)
         self.version = lib.xfsXsecTableVersion(self.table)
 
     def __enter__(self):
@@ -137,18 +137,17 @@ def read(path: str | os.PathLike, *, keys_only: bool = False) -> list[CrossSecti
     whose data blocks are malformed is left out with a warning. Raises
     TovaError when the file cannot be opened or is not a cross-section file,
     or when a header block yields no valid cross section (2010)."""
-    with _lib.lock:
-        lib = _lib.tova()
-        # Loaded without data, every cross section is valid, so this walk
-        # gives them all; with data, the library answers null for one made
-        # invalid by a malformed data block, which only the count tells
-        # apart from the end of the table.
-        with _Table(lib, path, LOAD_KEYS_ONLY) as table:
-            sections = [_section(rec) for rec in table.walk(None)]
-        if keys_only or not sections:
-            return sections
-        with _Table(lib, path, 0) as table:
-            loaded = [_section(rec) if rec is not None else None for rec in table.walk(len(sections))]
+    lib = _lib.tova()
+    # Loaded without data, every cross section is valid, so this walk
+    # gives them all; with data, the library answers null for one made
+    # invalid by a malformed data block, which only the count tells
+    # apart from the end of the table.
+    with _Table(lib, path, LOAD_KEYS_ONLY) as table:
+        sections = [_section(rec) for rec in table.walk(None)]
+    if keys_only or not sections:
+        return sections
+    with _Table(lib, path, 0) as table:
+        loaded = [_section(rec) if rec is not None else None for rec in table.walk(len(sections))]
     for bare, full in zip(sections, loaded):
         if full is None:
             warnings.warn(f"{os.fspath(path)}: cross section {bare.keys} has malformed data and is left out",
@@ -158,7 +157,7 @@ def read(path: str | os.PathLike, *, keys_only: bool = False) -> list[CrossSecti
 
 def version(path: str | os.PathLike) -> int:
     """The format version of a cross-section file."""
-    with _lib.lock, _Table(_lib.tova(), path, LOAD_KEYS_ONLY) as table:
+    with _Table(_lib.tova(), path, LOAD_KEYS_ONLY) as table:
         return table.version
 
 
@@ -238,17 +237,16 @@ def write(path: str | os.PathLike, sections) -> None:
     before the file is created; raises TovaError."""
     prepared = [_prepared(cs, i) for i, cs in enumerate(sections)]
     name = os.fspath(path)
-    with _lib.lock:
-        lib = _lib.tova()
-        file = c_void_p()
-        check(lib.xfsFileOpenCreate(_lib.encode(path), byref(file)), name)
-        try:
-            for i, p in enumerate(prepared):
-                _write_one(lib, file, p, f"{name}: cross section {i}")
-        except BaseException:
-            lib.xfsFileClose(byref(file))
-            raise
-        check(lib.xfsFileClose(byref(file)), name)
+    lib = _lib.tova()
+    file = c_void_p()
+    check_open(lib.xfsFileOpenCreate(_lib.encode(path), byref(file)), name, writing=True)
+    try:
+        for i, p in enumerate(prepared):
+            _write_one(lib, file, p, f"{name}: cross section {i}")
+    except BaseException:
+        lib.xfsFileClose(byref(file))
+        raise
+    check(lib.xfsFileClose(byref(file)), name)
 
 
 __all__ = ["CrossSection", "LOAD_KEYS_ONLY", "read", "version", "write"]

@@ -388,8 +388,27 @@ TOVA_API int32_t TOVA_CALL grdFileCreateEx(const char* name, HeaderHandle header
 TOVA_API int32_t TOVA_CALL grdFileRead(const char* name, HeaderHandle* header, FileHandle* file);
 TOVA_API int32_t TOVA_CALL grdFileEdit(const char* name, HeaderHandle* header, FileHandle* file);
 TOVA_API int32_t TOVA_CALL grdFileAppend(const char* name, HeaderHandle* header, FileHandle* file);
+/* What each call guarantees once it returns 0:
+ * - grdFileFlush, grdFileFlushTimeStep: every value written so far has been
+ *   handed to the operating system (it survives the end of the process, a
+ *   crash or a kill included). The header on disk is brought up to date at
+ *   most once a second once two time steps are written (grdFileFlush: the
+ *   whole header; grdFileFlushTimeStep: its time axis); until then it may
+ *   count fewer time steps than the file holds, which `tova repair` or
+ *   grdFileRecover put right. A write that failed earlier makes both return
+ *   its status (2002, or 2005 when the flush itself fails): the values from
+ *   that write on are not in the file.
+ * - grdFileSync: as grdFileFlush, and the header is always brought up to
+ *   date; then the system has written the file to its storage device
+ *   (fsync; FlushFileBuffers on Windows), so it also survives a power loss.
+ *   Costs a device write: call it at checkpoints, not per time step. 2005
+ *   when the system reports the device write as failed; 2015 for a file
+ *   opened for reading.
+ * - grdFileClose: the header is up to date and the file closed; the values
+ *   are with the system as after a flush, not necessarily on the device. */
 TOVA_API int32_t TOVA_CALL grdFileFlush(HeaderHandle header, FileHandle file);
 TOVA_API int32_t TOVA_CALL grdFileFlushTimeStep(HeaderHandle header, FileHandle file);
+TOVA_API int32_t TOVA_CALL grdFileSync(HeaderHandle header, FileHandle file);
 /* Rewrites the header of a writable file, then closes it and nulls *file.
  * When the final header update fails the file stays open (retry possible);
  * a caller that gives up releases it with rcfFileClose(file). */

@@ -53,6 +53,9 @@ struct RcfFile {
     // moves while the file is open, so positioning can go there at once.
     int64_t dynamicStart = -1;
     int64_t timeStepLength = 0;
+    // The offset where the header stream ends (-1 before it was written or
+    // read): how much an in-place header update reads at once.
+    int64_t headerEnd = -1;
 
     RcfFile() = default;
     RcfFile(const RcfFile&) = delete;
@@ -91,6 +94,10 @@ void rcfSeekAppBase(FileHandle h);
 // rcfAllocationFails consumes one allocation and says whether it is to fail.
 bool rcfAllocationFails() noexcept;
 int32_t rcfTestFailAllocation(int32_t nth) noexcept;
+
+// Flushes the stream and has the system write its file to the storage
+// device (fsync, FlushFileBuffers); false when either fails.
+bool rcfStreamSync(std::FILE* stream);
 
 // Monotonic milliseconds, the clock of openClock (flush throttles compare against it).
 uint32_t rcfClockMs();

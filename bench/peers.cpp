@@ -109,6 +109,7 @@ struct Options {
     std::vector<int> scaleSteps = {10, 100, 1000};
     std::vector<int> scaleItems = {10, 100, 1000, 10000};
     int nc4OpenMax = 2000;  // netCDF-4 opens of more items are skipped (they take minutes)
+    int wideItems = 10000, wideSteps = 50, wideReads = 2000;
 
     void smoke() {
         repeats = 1;
@@ -123,6 +124,7 @@ struct Options {
         threadSteps = 2;
         scaleSteps = {2, 4, 8};
         scaleItems = {5, 10, 20};
+        wideItems = 200, wideSteps = 5, wideReads = 20;
     }
     bool runs(int w) const { return only.empty() || std::find(only.begin(), only.end(), w) != only.end(); }
 };
@@ -147,7 +149,8 @@ const char* kUsage =
     "             [--series-steps=N] [--series-steps-nc4=N] [--random-steps=N] [--random-reads=N]\n"
     "             [--random-probes=N] [--open-items=N] [--open-repeats=N] [--comp-fraction=F]\n"
     "             [--comp-steps=N] [--thread-steps=N] [--threads=1,2,4] [--scale-steps=10,100,1000]\n"
-    "             [--scale-items=10,100,1000,10000] [--nc4-open-max=N]\n";
+    "             [--scale-items=10,100,1000,10000] [--nc4-open-max=N] [--wide-items=N] [--wide-steps=N]\n"
+    "             [--wide-reads=N]\n";
 
 Options parseOptions(int argc, char** argv) {
     Options o;
@@ -186,6 +189,9 @@ Options parseOptions(int argc, char** argv) {
         else if (key == "--scale-steps") o.scaleSteps = intList(value);
         else if (key == "--scale-items") o.scaleItems = intList(value);
         else if (key == "--nc4-open-max") o.nc4OpenMax = num();
+        else if (key == "--wide-items") o.wideItems = num();
+        else if (key == "--wide-steps") o.wideSteps = num();
+        else if (key == "--wide-reads") o.wideReads = num();
         else {
             std::fputs(kUsage, stderr);
             std::exit(2);
@@ -812,6 +818,7 @@ public:
         if (opt_.runs(6)) compressed();
         if (opt_.runs(7)) threads();
         if (opt_.runs(8)) scaling();
+        if (opt_.runs(9)) wideFiles();
         printTargets();
     }
 
@@ -1457,6 +1464,104 @@ private:
         });
         std::printf("\nnetCDF-4 opens of more than %s items are skipped: they take minutes.\n",
                     fmtCount(opt_.nc4OpenMax).c_str());
+    }
+
+    // ---- 9. Wide files
+
+    struct WideResult {
+        const ContenderKind* kind;
+        double create = NAN, close = NAN, open = NAN, first = NAN, last = NAN;
+    };
+
+    // Create (the header of every item), write all steps (untimed), close
+    // (for tova: the final header update); the medians of the rounds. The
+    // file of the last round stays.
+    void wideWrite(const ContenderKind& k, const std::string& p, const Shape& s, WideResult& r) const {
+        std::vector<double> created, closed;
+        for (int rep = 0; rep < opt_.repeats; ++rep) {
+            auto c = k.make(nullptr);
+            auto t0 = Clock::now();
+            c->create(p, s);
+            created.push_back(since(t0));
+            for (int t = 0; t < s.steps; ++t)
+                for (int i = 0; i < s.items; ++i) {
+                    const double v = seriesValue(t, i);
+                    c->write(t, i, &v);
+                }
+            t0 = Clock::now();
+            c->finish();
+            closed.push_back(since(t0));
+        }
+        r.create = median(created);
+        r.close = median(closed);
+    }
+
+    void wideFiles() {
+        const Shape s = seriesShape(opt_.wideItems, opt_.wideSteps);
+        heading("9. Wide files",
+                "A file of " + fmtCount(s.items) + " double scalar items and " + fmtCount(s.steps) +
+                    " time steps. Create (the file and its header) and close after writing every step (for tova "
+                    "the final in-place update of the header), median of " + std::to_string(opt_.repeats) +
+                    "; open as workload 4; then a positioned read of the first and of the last item of a "
+                    "random time step, " + fmtCount(opt_.wideReads) + " times each (median of " +
+                    std::to_string(opt_.repeats) + " runs). netCDF-4 is left out (its open of this many "
+                    "variables takes minutes).");
+        std::mt19937_64 rng(20241124);
+        std::vector<std::pair<int, int>> first(static_cast<size_t>(opt_.wideReads)), last(first.size());
+        for (size_t n = 0; n < first.size(); ++n) {
+            const int t = static_cast<int>(rng() % static_cast<uint64_t>(s.steps));
+            first[n] = {t, 0};
+            last[n] = {t, s.items - 1};
+        }
+        std::vector<WideResult> results;
+        for (auto* k : kinds_) {
+            if (k->key == "nc4") continue;
+            progress("wide files", *k);
+            WideResult r{k};
+            const std::string p = path(*k, "wide");
+            wideWrite(*k, p, s, r);
+            auto c = k->make(nullptr);
+            std::vector<double> opens;
+            for (int rep = 0; rep < std::max(3, opt_.repeats); ++rep) {
+                const auto t0 = Clock::now();
+                if (c->inspect(p) < s.items) fail(k->title + ": fewer items than written");
+                opens.push_back(since(t0));
+            }
+            r.open = median(opens);
+            c->open(p, s);
+            std::vector<double> a, b;
+            for (int rep = 0; rep < opt_.repeats; ++rep) {
+                a.push_back(timedReads(*c, first));
+                b.push_back(timedReads(*c, last));
+            }
+            r.first = median(a), r.last = median(b);
+            c->close();
+            remove(p);
+            results.push_back(r);
+        }
+        std::printf("| contender | create | close | close / create | open | positioned read, first item | "
+                    "last item | last / first |\n|---|---|---|---|---|---|---|---|\n");
+        for (const auto& r : results)
+            std::printf("| %s | %s | %s | %s | %s | %s | %s | %s |\n", r.kind->title.c_str(), fmtTime(r.create).c_str(),
+                        fmtTime(r.close).c_str(), fmtRatio(r.close / r.create).c_str(), fmtTime(r.open).c_str(),
+                        fmtTime(r.first).c_str(), fmtTime(r.last).c_str(), fmtRatio(r.last / r.first).c_str());
+        const WideResult* tova = find(results, "tova");
+        if (tova == nullptr) return;
+        const double closeRatio = tova->close / tova->create;
+        target("9", "tova close <= 2 x its create", closeRatio, fmtRatio(closeRatio), closeRatio <= 2.0);
+        const double lastRatio = tova->last / tova->first;
+        target("9", "tova positioned read of the last item <= 1.5 x the first", lastRatio, fmtRatio(lastRatio),
+               lastRatio <= 1.5);
+        if (const WideResult* raw = find(results, "raw")) {
+            const double x = tova->first / raw->first;
+            target("9", "tova positioned read of the first item <= 10 x raw stdio", x, fmtRatio(x), x <= 10.0);
+        }
+        if (const WideResult* nc3 = find(results, "nc3")) {
+            const double open = nc3->open / tova->open, read = nc3->last / tova->last;
+            target("9", "tova open >= 1.0 x netCDF classic", open, fmtRatio(open), open >= 1.0);
+            target("9", "tova positioned read of the last item >= 1.0 x netCDF classic", read, fmtRatio(read),
+                   read >= 1.0);
+        }
     }
 
     void printTargets() const {

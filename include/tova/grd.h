@@ -547,13 +547,23 @@ TOVA_API int32_t TOVA_CALL grdFileEdit(const char* name, HeaderHandle* header, F
  * file recovered with grdFileRecover); the cursor stands after them. Arguments and statuses as
  * grdFileRead. */
 TOVA_API int32_t TOVA_CALL grdFileAppend(const char* name, HeaderHandle* header, FileHandle* file);
-/** Brings the header on disk up to date (time-step count, time axis, statistics) and flushes the stream, so
- * that a reader, or grdFileRecover after a crash, finds the time steps written so far. Once two time steps
- * are written, an update less than a second after the last one is skipped, so it may be called after every
- * time step. 1000 for null handles; 2005 when the stream flush fails; 2015 for a file open for reading. */
+/** Hands every value written so far to the operating system (it then survives the end of the process, a
+ * crash or a kill included) and brings the header on disk up to date (time-step count, time axis,
+ * statistics), so that a reader, or grdFileRecover after a crash, finds the time steps written so far. The
+ * flush always happens; once two time steps are written, a header update less than a second after the last
+ * one is skipped (the header may then count fewer steps than the file holds, which grdFileRecover or
+ * `tova repair` put right), so it may be called after every time step. 1000 for null handles; 2005 when the
+ * stream flush fails; 2002 (or 2005) when an earlier write failed: the values from that write on are not in
+ * the file; 2015 for a file open for reading. */
 TOVA_API int32_t TOVA_CALL grdFileFlush(HeaderHandle header, FileHandle file);
 /** As grdFileFlush, rewriting only the time information of the header. */
 TOVA_API int32_t TOVA_CALL grdFileFlushTimeStep(HeaderHandle header, FileHandle file);
+/** Durability against power loss, for checkpoints: as grdFileFlush, but the header is always brought up to
+ * date, and then the system writes the file to its storage device (fsync; FlushFileBuffers on Windows).
+ * Costs a device write: not for every time step. grdFileClose, by contrast, leaves the values with the
+ * system as a flush does. Statuses as grdFileFlush; 2005 also when the device write fails; 2015 for a file
+ * open for reading. */
+TOVA_API int32_t TOVA_CALL grdFileSync(HeaderHandle header, FileHandle file);
 /** Rewrites the header of a writable file, then closes it and nulls *file.
  * When the final header update fails the file stays open (retry possible);
  * a caller that gives up releases it with rcfFileClose(file). */

@@ -33,6 +33,14 @@ void grdConvertItemData(const GrdHeader* header, const GrdItem* item, void* data
 // passes unchanged.
 double grdConvertItemValue(const GrdHeader* header, const GrdItem* item, double value) noexcept;
 
+// Reads the block that opens a time step and makes its time the header's
+// current time (the stored time, or the step's index for the equidistant
+// file types, as grdCallerTime gives it). 2010 for a block of another kind.
+int32_t grdReadTimeStepBlock(GrdHeader* header, FileHandle file);
+// A time as callers see it: with the modify-times switch on, the times of a
+// non-equidistant axis count from its start.
+double grdCallerTime(const GrdHeader* header, double time) noexcept;
+
 // Statistics update of item itemNo (1-based) with its used elements as
 // written (converted into the item's unit, gathered when compressed).
 // Traced "grdCalcStatistics %d"; 2010 for an unknown statistics type (the

@@ -13,6 +13,7 @@
 
 #include "common/capi.h"
 #include "grd/fileio.h"
+#include "grd/grdimage.h"
 #include "grd/grdio.h"
 #include "grd/grdstream.h"
 #include "qty/qty.h"
@@ -552,6 +553,7 @@ public:
     }
 
     int32_t status() const { return status_; }
+    const LrecNode* records() const { return head_; }
     bool sameShape(const LrecNode* list) const {
         const LrecNode* a = head_;
         for (; a != nullptr && list != nullptr; a = a->next, list = list->next)
@@ -842,6 +844,7 @@ int32_t grdWriteHeader(HeaderHandle header, FileHandle file) {
 
     for (const GrdCustomBlock* c = header->customBlocks.get(); c != nullptr && status == F_NO_ERROR; c = c->next.get())
         status = writeBlock(header, file, kTagCustomBlock, __LINE__, [&](OutBlock& b) { fillCustomBlock(c, b); });
+    if (status == F_NO_ERROR) file->headerEnd = rcfTell64(file);
     return trace.done(status);
 }
 
@@ -1358,6 +1361,7 @@ HeaderHandle grdReadHeader(FileHandle file, int32_t* status) {
     if (code == F_NO_ERROR) {
         file->ownerMark = 1;
         code = HeaderReader(file, header.get(), trace).run();
+        if (code == F_NO_ERROR) file->headerEnd = rcfTell64(file);
     }
     if (code != F_NO_ERROR) header.reset();  // a header that failed is never handed out
     if (status != nullptr) *status = code;
@@ -1376,31 +1380,28 @@ HeaderHandle grdReadHeader(FileHandle file, int32_t* status) {
 
 namespace {
 
-// Rewrites the block at pos (the next block of edit). fill(block, old)
-// fills the new block from the header and returns false to leave the old
-// one as it is.
+// Rewrites a block of the image. fill(block, old) fills the new block from
+// the header and returns false to leave the old one as it is.
 template <class Fill>
-int32_t rewriteBlock(HeaderHandle header, FileHandle edit, int32_t tag, int64_t pos, Fill fill) {
-    InBlock old(header);
-    if (old.read(edit, 0, 0, __LINE__) != F_NO_ERROR) return old.status();
-    OutBlock block(header, old.first());
-    if (!fill(block, old.first()) || block.status() != F_NO_ERROR) return block.status();
-    if (!block.sameShape(old.first())) return F_NO_ERROR;  // its size would change: left as it is
-    grdSeekTo(edit, pos);
-    return block.write(static_cast<uint16_t>(tag), edit, __LINE__);
+int32_t rewriteBlock(HeaderHandle header, GrdStreamImage& image, const GrdStreamImage::Block& at, Fill fill) {
+    OutBlock block(header, at.records);
+    if (!fill(block, at.records) || block.status() != F_NO_ERROR) return block.status();
+    if (block.sameShape(at.records)) image.replace(at, block.records());  // else its size would change: left
+    return F_NO_ERROR;
 }
 
 // Brings the header's time-axis counters up to date (the number of time
 // steps written; for the non-equidistant kinds the span to the last time
 // written) and rewrites the time block at pos in the form the file holds.
-int32_t rewriteTimeBlock(HeaderHandle header, FileHandle edit, int32_t tag, int64_t pos) {
+int32_t rewriteTimeBlock(HeaderHandle header, FileHandle edit, GrdStreamImage& image, const GrdStreamImage::Block& at) {
+    const int32_t tag = at.tag;
     GrdTimeValues* v = grdTimeAxisValues(header);
     const int32_t kind = timeKindOfTag(tag);
     if (header->timeAxis.type != kind || v == nullptr) return report(header, edit, F_ERR_VALUE, __LINE__);
     if (header->timeStepsDone > v->timeSteps) v->timeSteps = header->timeStepsDone;
     if ((kind == F_TM_NEQ_AXIS || kind == F_CAL_NEQ_AXIS) && header->largestTime != F_DELETE_VALUE_DOUBLE)
         v->step = header->largestTime - v->start;
-    return rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+    return rewriteBlock(header, image, at, [&](OutBlock& b, const LrecNode*) {
         fillTimeBlock(header, tag, b);
         return true;
     });
@@ -1442,13 +1443,17 @@ bool isRewrittenField(int32_t tag) {
            (tag >= kTagDeleteFloat && tag <= kTagDataType);
 }
 
-// One full scan of the header blocks (grdUpdateHeader).
-int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, const GrdApiTrace& trace) {
+// One full scan of the header blocks (grdUpdateHeader), in the image of the
+// header stream; the bytes that changed go back in one transfer, also when
+// the scan failed (the blocks before the failure are rewritten).
+int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, GrdStreamImage& image, const GrdApiTrace& trace) {
     int32_t itemNo = 0;    // the item of the last item block met (0: none yet)
     int32_t customNo = 0;  // 60000 blocks met
     for (;;) {
-        const int64_t pos = rcfTell64(edit);
-        const int32_t tag = FQueryLogicalBlock(edit);
+        GrdStreamImage::Block at;
+        int32_t status = image.next(at);
+        if (status != F_NO_ERROR) return report(header, edit, status, __LINE__);
+        const int32_t tag = at.tag;
         if (tag == kTagStaticStart || tag == kTagDynamicStart) return F_NO_ERROR;
         if (tag == 0) {
             trace.print("Zero tag found, end of file, corrupt file");
@@ -1457,17 +1462,16 @@ int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, const GrdApiTr
         if (tag == kTagItem || tag == kTagItemText) ++itemNo;
         const GrdItem* item = grdHeaderItem(header, itemNo);
         bool older = false;
-        int32_t status = F_NO_ERROR;
         if (isRewrittenField(tag)) {
-            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+            status = rewriteBlock(header, image, at, [&](OutBlock& b, const LrecNode*) {
                 // A projection that the header no longer has stays as it is.
                 return (tag != kTagProjection || header->geoInfoType == F_UTM_PROJECTION) &&
                        fillHeaderField(header, tag, b);
             });
         } else if (isTimeTag(tag)) {
-            status = rewriteTimeBlock(header, edit, tag, pos);
+            status = rewriteTimeBlock(header, edit, image, at);
         } else if (item != nullptr && (tag == kTagItem || tag == kTagItemText)) {
-            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+            status = rewriteBlock(header, image, at, [&](OutBlock& b, const LrecNode*) {
                 // An item whose unit changed between key and text needs the other block.
                 const bool unitAsText = tag == kTagItemText;
                 if (unitAsText != (item->unit < 0)) return false;
@@ -1475,12 +1479,12 @@ int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, const GrdApiTr
                 return true;
             });
         } else if (item != nullptr && tag == kTagValueType) {
-            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode*) {
+            status = rewriteBlock(header, image, at, [&](OutBlock& b, const LrecNode*) {
                 b.value(RCF_INT4, item->valueType);
                 return true;
             });
         } else if (item != nullptr && axisTypeOfTag(tag, &older) != 0) {
-            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode* old) {
+            status = rewriteBlock(header, image, at, [&](OutBlock& b, const LrecNode* old) {
                 // Another axis kind or other sizes: the item's data on disk
                 // are laid out by the stored axis, which therefore stays.
                 if (axisTagOf(item->axisType, older) != tag || !sameSizes(item, older, old)) return false;
@@ -1488,7 +1492,7 @@ int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, const GrdApiTr
                 return true;
             });
         } else if (item != nullptr && tag == kTagElemStats) {
-            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode* old) {
+            status = rewriteBlock(header, image, at, [&](OutBlock& b, const LrecNode* old) {
                 // Only a stored block of the same size is replaced: building
                 // one of another size would be wasted (it is left as it is),
                 // and a damaged header could make it gigabytes large.
@@ -1500,7 +1504,7 @@ int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, const GrdApiTr
             });
         } else if (tag == kTagCustomBlock) {
             ++customNo;
-            status = rewriteBlock(header, edit, tag, pos, [&](OutBlock& b, const LrecNode* old) {
+            status = rewriteBlock(header, image, at, [&](OutBlock& b, const LrecNode* old) {
                 const GrdCustomBlock* c = customBlockFor(header, customNo, old);
                 if (c == nullptr) return false;
                 fillCustomBlock(c, b);
@@ -1509,7 +1513,6 @@ int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, const GrdApiTr
         } else {
             // Section starts, the item count, file type, statistics type,
             // compressed flag, associations and whatever else is not ours.
-            status = FSkipLogicalBlock(edit);
             trace.print("Unknown tag found %d", tag);
         }
         if (status != F_NO_ERROR) return status;
@@ -1517,37 +1520,47 @@ int32_t rewriteHeaderBlocks(HeaderHandle header, FileHandle edit, const GrdApiTr
 }
 
 // One scan for the time block (grdUpdateHeaderTime).
-int32_t rewriteTimeOnly(HeaderHandle header, FileHandle edit, const GrdApiTrace& trace) {
+int32_t rewriteTimeOnly(HeaderHandle header, FileHandle edit, GrdStreamImage& image, const GrdApiTrace& trace) {
     for (;;) {
-        const int64_t pos = rcfTell64(edit);
-        const int32_t tag = FQueryLogicalBlock(edit);
-        if (isTimeTag(tag)) return rewriteTimeBlock(header, edit, tag, pos);
-        if (tag == kTagStaticStart || tag == kTagDynamicStart) return F_NO_ERROR;
-        if (tag == 0) {
+        GrdStreamImage::Block at;
+        const int32_t status = image.next(at);
+        if (status != F_NO_ERROR) return report(header, edit, status, __LINE__);
+        if (isTimeTag(at.tag)) return rewriteTimeBlock(header, edit, image, at);
+        if (at.tag == kTagStaticStart || at.tag == kTagDynamicStart) return F_NO_ERROR;
+        if (at.tag == 0) {
             trace.print("Zero tag found, end of file, corrupt file");
             return F_NO_ERROR;
         }
-        const int32_t status = FSkipLogicalBlock(edit);
-        trace.print("Unknown tag found %d", tag);
-        if (status != F_NO_ERROR) return status;
+        trace.print("Unknown tag found %d", at.tag);
     }
 }
 
-// The frame of both updates: checks, the one-second throttle, the flush,
-// the second handle positioned at appBase, the scan, and the close of the
+// Hands the bytes the stream holds to the system. A failure stays the
+// file's error: the C library drops bytes it could not write, so nothing
+// may be written after them (the layout would shift).
+int32_t pushToSystem(HeaderHandle header, FileHandle file) {
+    if (file->readOnly != 0 || file->stream == nullptr || file->lastOp >= 0) return F_NO_ERROR;
+    if (std::fflush(file->stream) == 0) return F_NO_ERROR;
+    if (file->error == F_NO_ERROR || file->error == F_EOF) file->error = F_ERR_FLUSH;
+    return report(header, file, F_ERR_FLUSH, __LINE__);
+}
+
+// The frame of both updates: checks, the flush (always), the one-second
+// throttle, the second handle positioned at appBase with the image of the
+// header stream, the scan, the write of what changed, and the close of the
 // second handle.
 template <class Scan>
-int32_t runUpdate(HeaderHandle header, int32_t force, FileHandle file, const GrdApiTrace& trace, Scan scan) {
+int32_t runUpdate(HeaderHandle header, int32_t force, FileHandle file, const GrdApiTrace& trace, int64_t hint,
+                  Scan scan) {
     int32_t status = grdCheckHeaderFile(header, file, kModule, __LINE__);
     if (status != F_NO_ERROR) return status;
+    status = pushToSystem(header, file);
+    if (status != F_NO_ERROR) return status;
     // Without force at most one rewrite a second: openClock holds the time
-    // of the file's last flush in monotonic milliseconds.
+    // of the file's last header update in monotonic milliseconds.
     const uint32_t now = rcfClockMs();
     if (force == 0 && static_cast<uint32_t>(now - file->openClock) / 1000.0 <= 1.0) return F_NO_ERROR;
     if (file->readOnly != 0) return report(header, file, F_ERR_READONLY, __LINE__);
-    // Only a stream whose last transfer was a write holds bytes to flush.
-    if (file->stream != nullptr && file->lastOp < 0 && std::fflush(file->stream) != 0)
-        return report(header, file, F_ERR_FLUSH, __LINE__);
     file->openClock = now;
 
     // The second handle renews the edit stamp of the record-file header.
@@ -1558,7 +1571,13 @@ int32_t runUpdate(HeaderHandle header, int32_t force, FileHandle file, const Grd
     status = rcfGetError(edit);
     if (status != F_NO_ERROR) report(header, edit, status, __LINE__);
     trace.print("while_loop starts here");
-    if (status == F_NO_ERROR) status = scan(edit);
+    if (status == F_NO_ERROR) {
+        GrdStreamImage image(edit, hint);
+        status = scan(edit, image);
+        const int32_t stored = image.store();
+        if (stored != F_NO_ERROR) report(header, edit, stored, __LINE__);
+        if (status == F_NO_ERROR) status = stored;
+    }
     trace.print("ends here");
     // Closed in every case; a failed close counts when all else went well.
     const int32_t closed = FCloseFile(&edit);
@@ -1569,15 +1588,19 @@ int32_t runUpdate(HeaderHandle header, int32_t force, FileHandle file, const Grd
 
 int32_t grdUpdateHeaderTime(HeaderHandle header, int32_t force, FileHandle file) {
     GrdApiTrace trace("grdUpdateHeaderTime");
-    return trace.done(runUpdate(header, force, file, trace,
-                                [&](FileHandle edit) { return rewriteTimeOnly(header, edit, trace); }));
+    return trace.done(runUpdate(header, force, file, trace, 0, [&](FileHandle edit, GrdStreamImage& image) {
+        return rewriteTimeOnly(header, edit, image, trace);
+    }));
 }
 
 int32_t grdUpdateHeader(HeaderHandle header, int32_t force, FileHandle file) {
     GrdApiTrace trace("grdUpdateHeader");
-    return trace.done(runUpdate(header, force, file, trace, [&](FileHandle edit) {
+    // The whole stream is read at once when its length is known, with the
+    // mark of the block after it.
+    const int64_t hint = file != nullptr && file->headerEnd > 0 ? file->headerEnd - file->appBase + 3 : 0;
+    return trace.done(runUpdate(header, force, file, trace, hint, [&](FileHandle edit, GrdStreamImage& image) {
         file->deleteValFloat = header->deleteValFloat;
         file->deleteValDouble = header->deleteValDouble;
-        return rewriteHeaderBlocks(header, edit, trace);
+        return rewriteHeaderBlocks(header, edit, image, trace);
     }));
 }

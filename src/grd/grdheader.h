@@ -301,6 +301,17 @@ struct GrdHeader {
 
     int32_t modifyTimes = 1;
 
+    // Where each item's record lies within a time step (grdItemRecordOffsets),
+    // and what it was worked out from. layoutSerial is raised whenever an
+    // item's data type or axis is set.
+    struct RecordOffsets {
+        std::vector<int64_t> at;  // item i's record starts at[i] bytes after the time-step block; at[n]: all
+        const GrdItem* items = nullptr;
+        int32_t count = -1, fileType = 0, compressed = 0, keyLength = 0;
+        uint32_t serial = 0;
+    } recordOffsets;
+    uint32_t layoutSerial = 0;
+
     GrdHeader() = default;
     GrdHeader(const GrdHeader&) = delete;
     GrdHeader& operator=(const GrdHeader&) = delete;

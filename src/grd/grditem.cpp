@@ -125,6 +125,7 @@ int32_t assignItemInfo(HeaderHandle header, GrdItem* item, int32_t itemType, con
     item->dataType = dataType;
     item->axisType = axisType;
     item->owner = header;
+    ++header->layoutSerial;
     if (!item->isStatic) {
         const int32_t stats = grdItemInitStatistics(header, item, kModule, line);
         if (status == F_NO_ERROR) status = stats;
@@ -273,6 +274,7 @@ int32_t setAxis(ItemHandle item, int32_t axisType, int32_t unit, const AxisIn& i
     int64_t before = item->axisType == F_UNDEFINED_AXIS ? 0 : grdItemElementCount(item);
     item->axisType = axisType;
     item->axisUnit = unit;
+    if (item->owner != nullptr) ++item->owner->layoutSerial;
     for (int32_t d = 0; d < 4; ++d) {
         item->size[d] = d < dirs ? in.sizes[d] : 0;
         item->origin[d] = 0.0f;

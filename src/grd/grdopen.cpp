@@ -370,14 +370,21 @@ int32_t markEndOfHeader(HeaderHandle header, FileHandle file) {
     return F_NO_ERROR;
 }
 
+// Both flushes hand the stream's bytes to the system whatever the throttle
+// decides about the header; a write that failed before (reported then) is
+// returned again, since the bytes after it never reached the file. sync
+// forces the header update and then has the system put the file on its
+// storage device.
 template <class Update>
-int32_t flushFile(HeaderHandle header, FileHandle file, Update update) {
+int32_t flushFile(HeaderHandle header, FileHandle file, Update update, bool sync = false) {
     // A file of the legacy translator would be flushed by it here; none ships.
     int32_t status = grdCheckHeaderFile(header, file, kModule, __LINE__);
     if (status != F_NO_ERROR) return status;
     status = markEndOfHeader(header, file);
-    if (status == F_NO_ERROR) status = update(header, forceFlag(header), file);
+    if (status == F_NO_ERROR) status = update(header, sync ? 1 : forceFlag(header), file);
     TdProject_AddFile(file->filname);
+    if (status == F_NO_ERROR && file->error > F_EOF) status = file->error;
+    if (status == F_NO_ERROR && sync && !rcfStreamSync(file->stream)) status = report(header, file, F_ERR_FLUSH, __LINE__);
     return status;
 }
 
@@ -448,6 +455,11 @@ int32_t TOVA_CALL grdFileFlush(HeaderHandle header, FileHandle file) {
 int32_t TOVA_CALL grdFileFlushTimeStep(HeaderHandle header, FileHandle file) {
     GrdApiTrace trace("grdFileFlushTimeStep");
     return trace.done(tova::guarded([&] { return flushFile(header, file, grdUpdateHeaderTime); }));
+}
+
+int32_t TOVA_CALL grdFileSync(HeaderHandle header, FileHandle file) {
+    GrdApiTrace trace("grdFileSync");
+    return trace.done(tova::guarded([&] { return flushFile(header, file, grdUpdateHeader, true); }));
 }
 
 int32_t TOVA_CALL grdFileClose(HeaderHandle header, FileHandle* file) {

@@ -5,6 +5,7 @@
 // of the measured length of one time step, checked on arrival, so that
 // finding a time step costs the same wherever it lies.
 #include <cstdint>
+#include <vector>
 
 #include "common/capi.h"
 #include "grd/fileio.h"
@@ -75,6 +76,57 @@ int32_t findBlock(FileHandle file, int32_t code) {
         }
     }
     return takeError(nullptr, file, __LINE__);
+}
+
+// The fixed-space file types whose records follow from the header alone.
+bool fixedSpace(const GrdHeader* header) {
+    return header->fileType == F_EQTIME_FIXEDSPACE_ALLITEMS || header->fileType == F_NEQTIME_FIXEDSPACE_ALLITEMS;
+}
+
+// Where each item's record starts within a time step, counted from the end
+// of the time-step block (the last entry: where the step ends), for the
+// fixed-space file types while no plug-in stands between; null otherwise or
+// when an item's record size does not follow from the header. Worked out
+// once and again only when the items change.
+const int64_t* recordOffsets(GrdHeader* header) {
+    if (!fixedSpace(header) || grdPluginRoutes(header) || header->noOfItems <= 0 || !header->items) return nullptr;
+    GrdHeader::RecordOffsets& o = header->recordOffsets;
+    if (o.items != header->items.get() || o.count != header->noOfItems || o.fileType != header->fileType ||
+        o.compressed != header->fileCompressed || o.keyLength != header->keyLength || o.serial != header->layoutSerial) {
+        o.at.clear();
+        o.items = header->items.get();
+        o.count = header->noOfItems;
+        o.fileType = header->fileType;
+        o.compressed = header->fileCompressed;
+        o.keyLength = header->keyLength;
+        o.serial = header->layoutSerial;
+        std::vector<int64_t> at(static_cast<size_t>(header->noOfItems) + 1, 0);
+        for (int32_t i = 0; i < header->noOfItems; ++i) {
+            const GrdItem* item = &header->items[i];
+            const int64_t used = grdItemUsedElementCount(item);
+            const int64_t size = grdSimpleTypeSize(item->dataType);
+            // The same records the cursor checks let through, no others.
+            if (used <= 0 || size <= 0 || grdItemElementCount(item) <= 0 ||
+                used > static_cast<int64_t>(UINT32_MAX) / size)
+                return nullptr;
+            at[static_cast<size_t>(i) + 1] = at[static_cast<size_t>(i)] + 5 + used * size;
+        }
+        o.at = std::move(at);
+    }
+    return o.at.empty() ? nullptr : o.at.data();
+}
+
+// Bytes of the block that opens a time step: start mark, tag and
+// terminator, and for the non-equidistant type the time (a record of one
+// double).
+int64_t timeStepBlockBytes(const GrdHeader* header) {
+    return header->fileType == F_NEQTIME_FIXEDSPACE_ALLITEMS ? 3 + 5 + 8 + 1 : 3 + 1;
+}
+
+// The length of one time step as the header gives it; 0 when it does not.
+int64_t stepLengthOf(GrdHeader* header) {
+    const int64_t* at = recordOffsets(header);
+    return at != nullptr ? timeStepBlockBytes(header) + at[header->noOfItems] : 0;
 }
 
 // 1001 when t lies outside 0 ... the time axis's count of time steps (the
@@ -185,7 +237,21 @@ int32_t jumpFromStart(GrdHeader* header, FileHandle file, int32_t t) {
         return F_NO_ERROR;
     }
     if (file->error > F_EOF) return takeError(header, file, __LINE__);
+    file->timeStepLength = 0;  // the time steps are not all of that length
     return walkToTimeStep(header, file, t);
+}
+
+// Whether time step t of a file opened for reading is reached without a
+// check on arrival: the length of a time step follows from the header and
+// was confirmed by an earlier checked jump. (A file being written may end
+// anywhere; its jumps are always checked.)
+bool trustedJump(GrdHeader* header, FileHandle file, int32_t t, int64_t* position) {
+    const int64_t length = stepLengthOf(header);
+    if (file->readOnly == 0 || length <= 0 || file->timeStepLength != length || file->dynamicStart < 0 ||
+        t > (INT64_MAX - file->dynamicStart) / length)
+        return false;
+    *position = file->dynamicStart + t * length;
+    return true;
 }
 
 // Positions at time step t, item 1 (t already checked).
@@ -193,7 +259,24 @@ int32_t gotoTimeStep(GrdHeader* header, FileHandle file, int32_t t) {
     const bool inDynamic = file->ownerMark >= kSectionDynamic;
     const int32_t done = header->timeStepsDone;
     if (inDynamic && done == t && header->nextItem == 0) return F_NO_ERROR;
-    const bool shortForward = inDynamic && done < t && t - done < kJumpSteps;
+    int64_t position = 0;
+    if (trustedJump(header, file, t, &position)) {
+        grdSeekTo(file, position);
+        if (file->error != F_NO_ERROR) return takeError(header, file, __LINE__);
+        file->ownerMark = kSectionDynamic;
+        header->timeStepsDone = t;
+        header->nextItem = 0;
+        return F_NO_ERROR;
+    }
+    // Where the header gives the length of a time step, the first jump
+    // takes it (checked on arrival) instead of measuring one.
+    const int64_t length = stepLengthOf(header);
+    if (length > 0 && file->dynamicStart < 0) {
+        const int32_t status = grdFindBlockDynamic(header, file);
+        if (status != F_NO_ERROR) return status;
+    }
+    if (length > 0 && file->dynamicStart >= 0 && file->timeStepLength == 0) file->timeStepLength = length;
+    const bool shortForward = length == 0 && inDynamic && done < t && t - done < kJumpSteps;
     if (!shortForward && file->dynamicStart >= 0 && file->timeStepLength > 0 &&
         t <= (INT64_MAX - file->dynamicStart) / file->timeStepLength)
         return jumpFromStart(header, file, t);
@@ -222,30 +305,41 @@ int32_t staticItemFollows(GrdHeader* header, FileHandle file, bool* found) {
 }
 
 // Moves the cursor within its time step to item `wanted` (0-based, after
-// it) in one move of the file position, where each item's record length
-// follows from the header: past the time-step block (next item above 0),
-// fixed space (file types 1 and 4), no plug-in in between, every item
-// passed one that grdSkipItem would pass. Returns false, having done
-// nothing, otherwise: the caller skips item by item (and meets the
-// report). A random item is then found in time independent of its number.
+// it) in one move of the file position, where the record offsets follow
+// from the header (recordOffsets) and the cursor is past the time-step
+// block (next item above 0). Returns false, having done nothing, otherwise:
+// the caller skips item by item (and meets the report).
 bool skipItemsAtOnce(GrdHeader* header, FileHandle file, int32_t wanted) {
     if (header->nextItem <= 0 || header->nextItem >= wanted || wanted > header->noOfItems) return false;
-    if (header->fileType != F_EQTIME_FIXEDSPACE_ALLITEMS && header->fileType != F_NEQTIME_FIXEDSPACE_ALLITEMS)
-        return false;
-    if (grdPluginRoutes(header)) return false;
-    uint64_t bytes = 0;
-    for (int32_t i = header->nextItem; i < wanted; ++i) {
-        const GrdItem* item = &header->items[i];
-        const int64_t elements = grdItemElementCount(item);
-        const int64_t used = grdItemUsedElementCount(item);
-        const int64_t size = grdSimpleTypeSize(item->dataType);
-        if (elements <= 0 || used <= 0 || size <= 0) return false;
-        const int64_t limit = static_cast<int64_t>(UINT32_MAX) / size;
-        if (elements > limit || used > limit) return false;
-        bytes += 5 + static_cast<uint64_t>(used * size);  // the record's header and its elements
-    }
-    rcfSkipDeferred64(file, bytes);
+    const int64_t* at = recordOffsets(header);
+    if (at == nullptr) return false;
+    rcfSkipDeferred64(file, static_cast<uint64_t>(at[wanted] - at[header->nextItem]));
     header->nextItem = wanted;
+    return true;
+}
+
+// Positions a file opened for reading at item `wanted` (0-based, above 0)
+// of time step t in one move, where the time step is reached by a trusted
+// jump: the time comes from the time-step block for the non-equidistant
+// type (read first), else it is the step's index. False, having done
+// nothing, where that does not hold.
+bool jumpToItem(GrdHeader* header, FileHandle file, int32_t t, int32_t wanted, int32_t* status) {
+    int64_t step = 0;
+    const int64_t* at = recordOffsets(header);
+    if (wanted <= 0 || at == nullptr || !trustedJump(header, file, t, &step)) return false;
+    file->ownerMark = kSectionDynamic;
+    header->timeStepsDone = t;
+    header->nextItem = 0;
+    if (header->fileType == F_NEQTIME_FIXEDSPACE_ALLITEMS) {
+        grdSeekTo(file, step);
+        *status = file->error != F_NO_ERROR ? takeError(header, file, __LINE__) : grdReadTimeStepBlock(header, file);
+        if (*status == F_NO_ERROR) rcfSkipDeferred64(file, static_cast<uint64_t>(at[wanted]));
+    } else {
+        grdSeekTo(file, step + timeStepBlockBytes(header) + at[wanted]);
+        *status = file->error != F_NO_ERROR ? takeError(header, file, __LINE__) : F_NO_ERROR;
+        header->currentTime = grdCallerTime(header, t);
+    }
+    if (*status == F_NO_ERROR) header->nextItem = wanted;
     return true;
 }
 
@@ -355,7 +449,10 @@ int32_t TOVA_CALL grdFindItemDynamic(HeaderHandle header, FileHandle file, int32
         const bool inStep = file->ownerMark >= kSectionDynamic && header->timeStepsDone == timeStep;
         if (inStep && header->nextItem == wanted) return F_NO_ERROR;
         // Within the right time step and before the item: skip forward only.
-        if (!(inStep && header->nextItem < wanted)) status = gotoTimeStep(header, file, timeStep);
+        if (!(inStep && header->nextItem < wanted)) {
+            if (jumpToItem(header, file, timeStep, wanted, &status)) return status;
+            status = gotoTimeStep(header, file, timeStep);
+        }
         while (status == F_NO_ERROR && header->nextItem != wanted) {
             if (skipItemsAtOnce(header, file, wanted)) break;
             const int32_t before = header->nextItem;

@@ -126,11 +126,19 @@ int32_t writeTimeStepBlock(GrdHeader* header, FileHandle file, double time) {
     return report(header, file, F_ERR_DATA_TYPE, __LINE__);
 }
 
-// Reads the block that opens a time step and makes its time the header's
-// current time: the stored time for the non-equidistant file types, else the
-// index of the time step. With the modify-times switch on, times of a
-// non-equidistant axis are given relative to its start.
-int32_t readTimeStepBlock(GrdHeader* header, FileHandle file) {
+}  // namespace
+
+// ---- Time-step blocks read (shared with positioning) ------------------------------------------
+
+double grdCallerTime(const GrdHeader* header, double time) noexcept {
+    if (header->modifyTimes != 0) {
+        if (header->timeAxis.type == F_TM_NEQ_AXIS) time -= header->timeAxis.time.start;
+        if (header->timeAxis.type == F_CAL_NEQ_AXIS) time -= header->timeAxis.calendar.start;
+    }
+    return time;
+}
+
+int32_t grdReadTimeStepBlock(GrdHeader* header, FileHandle file) {
     header->currentTime = header->deleteValDouble;
     GrdRecordList block;
     uint16_t identifier = 0;
@@ -149,13 +157,11 @@ int32_t readTimeStepBlock(GrdHeader* header, FileHandle file) {
     } else {
         return report(header, file, F_ERR_DATA_TYPE, __LINE__);
     }
-    if (header->modifyTimes != 0) {
-        if (header->timeAxis.type == F_TM_NEQ_AXIS) time -= header->timeAxis.time.start;
-        if (header->timeAxis.type == F_CAL_NEQ_AXIS) time -= header->timeAxis.calendar.start;
-    }
-    header->currentTime = time;
+    header->currentTime = grdCallerTime(header, time);
     return F_NO_ERROR;
 }
+
+namespace {
 
 // ---- Compression ----------------------------------------------------------------------------
 
@@ -348,7 +354,7 @@ int32_t readItem(GrdHeader* header, FileHandle file, double* time, void* data) {
     int64_t stepStart = -1;
     if (header->nextItem == 0) {
         stepStart = rcfTell64(file);
-        status = readTimeStepBlock(header, file);
+        status = grdReadTimeStepBlock(header, file);
     }
     if (status == F_NO_ERROR) {
         status = data == nullptr ? grdCheckSkipLR(header, file, kModule, __LINE__)
@@ -374,7 +380,7 @@ int32_t skipItem(GrdHeader* header, FileHandle file) {
         return status;
     }
     if (header->nextItem == 0) {
-        status = readTimeStepBlock(header, file);
+        status = grdReadTimeStepBlock(header, file);
         if (status != F_NO_ERROR) return status;
     }
     const auto used = static_cast<uint32_t>(c.used);

@@ -53,6 +53,9 @@ struct RcfFile {
     // moves while the file is open, so positioning can go there at once.
     int64_t dynamicStart = -1;
     int64_t timeStepLength = 0;
+    // The offset where the header stream ends (-1 before it was written or
+    // read): how much an in-place header update reads at once.
+    int64_t headerEnd = -1;
 
     RcfFile() = default;
     RcfFile(const RcfFile&) = delete;
@@ -65,11 +68,12 @@ constexpr uint32_t kRcfVersionCurrent = 104;
 constexpr size_t kRcfStreamBufferSize = 256 * 1024;
 // Files opened for reading, or for editing, get a smaller buffer: every
 // jump to a far position refills the whole buffer, and readers and editors
-// are the ones that jump (an in-place header update switches between reading
-// and writing at every block). 16 KiB: a jump then costs a couple of
-// microseconds, and small records still cost one system call per hundreds
-// of them.
-constexpr size_t kRcfReadBufferSize = 16 * 1024;
+// are the ones that jump. 4 KiB, the C library's own size: a positioned
+// read then costs about what a raw seek and read of the same bytes cost,
+// and small records still cost one system call per hundreds of them
+// (records of the buffer's size and more bypass it). An in-place header
+// update reads the header stream in one transfer of its own.
+constexpr size_t kRcfReadBufferSize = 4 * 1024;
 
 // Handler form of this layer's own table (slots for 1000 and 2000-2019).
 using rcfErrorHandler = int32_t (*)(int32_t code, const char* module, int32_t line);
@@ -91,6 +95,10 @@ void rcfSeekAppBase(FileHandle h);
 // rcfAllocationFails consumes one allocation and says whether it is to fail.
 bool rcfAllocationFails() noexcept;
 int32_t rcfTestFailAllocation(int32_t nth) noexcept;
+
+// Flushes the stream and has the system write its file to the storage
+// device (fsync, FlushFileBuffers); false when either fails.
+bool rcfStreamSync(std::FILE* stream);
 
 // Monotonic milliseconds, the clock of openClock (flush throttles compare against it).
 uint32_t rcfClockMs();

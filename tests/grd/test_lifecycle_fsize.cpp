@@ -8,11 +8,14 @@
 #include <gtest/gtest.h>
 
 #include <csignal>
+#include <cerrno>
 #include <cstdint>
+#include <cstring>
 #include <filesystem>
 #include <functional>
 #include <vector>
 
+#include <sys/mount.h>
 #include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -111,10 +114,11 @@ TEST_F(WriteFailureTest, CreateThatCannotWriteItsHeaderLeavesNothing) {
 // record, most of the stream buffer) per step on an equidistant 1-D axis;
 // the limit falls inside step 3. The write that crosses it gives 2002 and
 // the steps before stay readable.
-class DynamicWriteFailure : public FileTest {
+// A file test of two float items of N values each on an equidistant 1-D axis.
+template <int32_t N>
+class TwoItemFile : public FileTest {
 protected:
-    static constexpr int32_t kValues = 40000;
-    static constexpr int32_t kSteps = 6;
+    static constexpr int32_t kValues = N;
 
     void SetUp() override {
         FileTest::SetUp();
@@ -127,6 +131,11 @@ protected:
         for (int32_t e = 0; e < kValues; ++e) v[size_t(e)] = static_cast<float>(hardtest::richValue(step, item, e));
         return v;
     }
+};
+
+class DynamicWriteFailure : public TwoItemFile<40000> {
+protected:
+    static constexpr int32_t kSteps = 6;
 };
 
 TEST_F(DynamicWriteFailure, TheCrossingWriteGives2002TheFileClosesAndEarlierStepsReadBack) {
@@ -178,6 +187,91 @@ TEST_F(DynamicWriteFailure, TheCrossingWriteGives2002TheFileClosesAndEarlierStep
         }
     }
     close();
+}
+
+
+// Acknowledged time steps when the file cannot grow: a writer that flushes
+// after every time step learns from the flush (or the write) of the first
+// step that did not reach the file, never later, whatever the one-second
+// throttle of the header update decides; every step acknowledged before
+// (its writes and its flush returned 0) reads back after recovery. Steps of
+// 8 kB fit the stream's buffer many times over.
+class AcknowledgedSteps : public TwoItemFile<1000> {
+protected:
+    // Writes and flushes steps until a call fails, then drops the file as a
+    // crashed writer would; gives the steps acknowledged and the failure.
+    std::vector<int32_t> writeUntilFull(const std::string& path) {
+        FileHandle file = nullptr;
+        if (grdFileCreate(path.c_str(), header_, &file) != 0) return {-1, -1};
+        int32_t acknowledged = 0, status = 0;
+        for (int32_t s = 0; s < 4000 && status == 0; ++s) {
+            for (int32_t i = 1; i <= 2 && status == 0; ++i)
+                status = grdWriteItemTimeStep(header_, file, s, values(s, i).data());
+            if (status == 0) status = grdFileFlush(header_, file);
+            if (status == 0) acknowledged = s + 1;
+        }
+        rcfFileClose(&file);
+        return {acknowledged, status};
+    }
+    void expectAcknowledgedStepsBack(const std::string& path, const std::vector<int32_t>& run) {
+        ASSERT_EQ(run.size(), 2u);
+        const int32_t acknowledged = run[0];
+        EXPECT_GE(acknowledged, 2);
+        EXPECT_TRUE(run[1] == 2002 || run[1] == 2005) << run[1];
+        int32_t found = -1, inHeader = -1;
+        ASSERT_EQ(grdFileRecover(path.c_str(), &found, &inHeader), 0);
+        EXPECT_GE(found, acknowledged);
+        openRead(path);
+        std::vector<float> got(kValues);
+        for (int32_t s = 0; s < acknowledged && !HasFailure(); ++s)
+            for (int32_t i = 1; i <= 2; ++i) {
+                double time = -1;
+                ASSERT_EQ(grdReadItemTimeStep(header_, file_, &time, got.data()), 0) << s << " " << i;
+                EXPECT_EQ(got, values(s, i)) << s << " " << i;
+            }
+        close();
+    }
+};
+
+TEST_F(AcknowledgedSteps, UnderAFileSizeLimitEveryAcknowledgedStepIsRecovered) {
+    const std::string path = dir_.file("limited.grd");
+    expectAcknowledgedStepsBack(path, inLimitedChild(kLimit, [&] { return writeUntilFull(path); }));
+}
+
+// The file system's size is no multiple of the stream's buffer: the buffer
+// that fills it holds acknowledged steps that do not fit.
+TEST_F(AcknowledgedSteps, OnAFullFileSystemEveryAcknowledgedStepIsRecovered) {
+    const std::string mountPoint = dir_.file("small");
+    std::filesystem::create_directory(mountPoint);
+    if (mount("tmpfs", mountPoint.c_str(), "tmpfs", 0, "size=600k") != 0)
+        GTEST_SKIP() << "no small file system to fill: mounting a tmpfs failed (" << std::strerror(errno) << ")";
+    struct Unmount {
+        std::string at;
+        ~Unmount() { umount(at.c_str()); }
+    } unmount{mountPoint};
+    const std::string path = mountPoint + "/full.grd";
+    expectAcknowledgedStepsBack(path, writeUntilFull(path));
+}
+
+TEST_F(AcknowledgedSteps, SyncPutsTheHeaderUpToDateAtOnce) {
+    const std::string path = dir_.file("synced.grd");
+    create(path);
+    for (int32_t s = 0; s < 5; ++s)
+        for (int32_t i = 1; i <= 2; ++i) ASSERT_EQ(grdWriteItemTimeStep(header_, file_, s, values(s, i).data()), 0);
+    // The throttle holds the header back; a sync does not wait for it.
+    ASSERT_EQ(grdFileFlush(header_, file_), 0);
+    ASSERT_EQ(grdFileSync(header_, file_), 0);
+    HeaderHandle h = nullptr;
+    FileHandle f = nullptr;
+    ASSERT_EQ(grdFileRead(path.c_str(), &h, &f), 0);
+    int32_t steps = -1;
+    grdGetEqTimeAxis(h, nullptr, nullptr, nullptr, nullptr, &steps, nullptr);
+    EXPECT_EQ(steps, 5);
+    EXPECT_EQ(grdFileSync(h, f), 2015);  // nothing to put on the device from a reader
+    grdFileClose(h, &f);
+    grdHeaderDestroy(&h);
+    close();
+    EXPECT_EQ(takeCodes(), std::vector<int32_t>{2015});
 }
 
 }  // namespace

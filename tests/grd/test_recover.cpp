@@ -7,6 +7,7 @@
 #include <csignal>
 #include <cstdint>
 #include <filesystem>
+#include <functional>
 #include <random>
 #include <string>
 #include <vector>
@@ -29,10 +30,11 @@ constexpr int32_t kElements = 5;
 float valueOf(int32_t t, int32_t n, int32_t e) { return static_cast<float>(1000 * t + 100 * n + e); }
 double timeOf(int32_t t) { return 10.0 + 2.5 * t + 0.25 * (t % 3); }
 
-// Creates path with kItems float items of kElements values; file type 1
-// (equidistant) or 4 (non-equidistant).
-void createFile(const std::string& path, int32_t fileType, HeaderHandle* header, FileHandle* file) {
-    ASSERT_EQ(grdHeaderCreate(fileType, "crash", "test", 1, kItems, 1, header), 0);
+// Creates path with kItems float items of `elements` values; file type 1
+// (equidistant) or 4 (non-equidistant), statistics type statsType.
+void createFile(const std::string& path, int32_t fileType, HeaderHandle* header, FileHandle* file,
+                int32_t elements = kElements, int32_t statsType = 1) {
+    ASSERT_EQ(grdHeaderCreate(fileType, "crash", "test", 1, kItems, statsType, header), 0);
     if (fileType == F_EQTIME_FIXEDSPACE_ALLITEMS) {
         ASSERT_EQ(grdSetEqTimeAxis(*header, QTY_UNIT_SECOND, 0.0, 60.0, 0), 0);
     } else {
@@ -41,17 +43,19 @@ void createFile(const std::string& path, int32_t fileType, HeaderHandle* header,
     for (int32_t n = 1; n <= kItems; ++n) {
         ItemHandle item = grdItemD(*header, n);
         ASSERT_EQ(grdSetItemInfo(*header, item, QTY_ITEM_UNDEFINED, "v", 0, RCF_FLOAT), 0);
-        ASSERT_EQ(grdSetItemAxisEqD1(item, 0, kElements, 0.0f, 1.0f), 0);
+        ASSERT_EQ(grdSetItemAxisEqD1(item, 0, elements, 0.0f, 1.0f), 0);
     }
     ASSERT_EQ(grdFileCreate(path.c_str(), *header, file), 0);
 }
 
+int32_t elementsOf(HeaderHandle header) { return static_cast<int32_t>(grdGetItemElements(grdItemD(header, 1))); }
+
 // Writes time step t; with items < kItems only that many items of it.
 int32_t writeStep(HeaderHandle header, FileHandle file, int32_t t, int32_t items = kItems) {
-    float values[kElements];
+    std::vector<float> values(static_cast<size_t>(elementsOf(header)));
     for (int32_t n = 1; n <= items; ++n) {
-        for (int32_t e = 0; e < kElements; ++e) values[e] = valueOf(t, n, e);
-        const int32_t status = grdWriteItemTimeStep(header, file, timeOf(t), values);
+        for (size_t e = 0; e < values.size(); ++e) values[e] = valueOf(t, n, static_cast<int32_t>(e));
+        const int32_t status = grdWriteItemTimeStep(header, file, timeOf(t), values.data());
         if (status != 0) return status;
     }
     return 0;
@@ -77,15 +81,16 @@ void expectSteps(const std::string& path, int32_t steps) {
         grdGetEqTimeAxis(h, nullptr, nullptr, nullptr, nullptr, &count, nullptr);
     }
     EXPECT_EQ(count, steps) << path;
-    float values[kElements];
+    std::vector<float> values(static_cast<size_t>(elementsOf(h)));
     for (int32_t t = 0; t < count && !testing::Test::HasFailure(); ++t) {
         for (int32_t n = 1; n <= kItems; ++n) {
             double time = 0;
-            ASSERT_EQ(grdReadItemTimeStep(h, f, &time, values), 0) << "step " << t;
+            ASSERT_EQ(grdReadItemTimeStep(h, f, &time, values.data()), 0) << "step " << t;
             if (neq) {
                 EXPECT_EQ(time, timeOf(t));
             }
-            for (int32_t e = 0; e < kElements; ++e) ASSERT_EQ(values[e], valueOf(t, n, e)) << t << " " << n << " " << e;
+            for (size_t e = 0; e < values.size(); ++e)
+                ASSERT_EQ(values[e], valueOf(t, n, static_cast<int32_t>(e))) << t << " " << n << " " << e;
         }
     }
     grdFileClose(h, &f);
@@ -252,14 +257,23 @@ TEST_F(RecoverTest, ForeignRecordsEndTheWalk) {
 // Writers killed with SIGKILL at random moments while they write and flush:
 // every complete step reads back as written, and appending after recovery
 // gives a valid file.
-TEST_F(RecoverTest, WritersKilledAtRandomMoments) {
+struct KillPlan {
+    int trials = 24;
+    int32_t elements = kElements;
+    int32_t statsType = 1;
+    int maxDelayUs = 80000;
+    // Trial k rewrites the header every updateEvery(k) steps (a second has
+    // passed then), flushing every flushEvery steps.
+    std::function<int32_t(int)> updateEvery;
+    int32_t flushEvery = 7;
+};
+
+void killWriters(const testutil::TempDir& dir, const KillPlan& plan) {
     std::mt19937 random(20240321);
-    for (int trial = 0; trial < 24; ++trial) {
+    for (int trial = 0; trial < plan.trials; ++trial) {
         const int32_t fileType = trial % 2 == 0 ? F_EQTIME_FIXEDSPACE_ALLITEMS : F_NEQTIME_FIXEDSPACE_ALLITEMS;
-        const std::string path = dir_.file("killed" + std::to_string(trial) + ".grd");
-        // Header updates between every few and every few thousand steps:
-        // the stream's buffer overflows in between, leaving unfinished steps.
-        const int32_t updateEvery = 97 + 400 * trial;
+        const std::string path = dir.file("killed" + std::to_string(trial) + ".grd");
+        const int32_t updateEvery = plan.updateEvery(trial);
         int ready[2];
         ASSERT_EQ(pipe(ready), 0);
         const pid_t child = fork();
@@ -268,7 +282,7 @@ TEST_F(RecoverTest, WritersKilledAtRandomMoments) {
             close(ready[0]);
             HeaderHandle h = nullptr;
             FileHandle f = nullptr;
-            createFile(path, fileType, &h, &f);
+            createFile(path, fileType, &h, &f, plan.elements, plan.statsType);
             // The header on disk before the parent's clock starts: a writer
             // killed before that leaves nothing to recover.
             if (f == nullptr || grdFileFlush(h, f) != 0) _exit(2);
@@ -279,7 +293,7 @@ TEST_F(RecoverTest, WritersKilledAtRandomMoments) {
                 // Flushes as a model run calls them; now and then a second
                 // has passed, and the header is rewritten.
                 if (t % updateEvery == 0) f->openClock -= 2000;
-                if (t % 7 == 0 && grdFileFlush(h, f) != 0) _exit(3);
+                if (t % plan.flushEvery == 0 && grdFileFlush(h, f) != 0) _exit(3);
                 if (t % 20 == 0) usleep(100);
             }
             _exit(4);  // not reached within the kill delay
@@ -288,7 +302,7 @@ TEST_F(RecoverTest, WritersKilledAtRandomMoments) {
         char go = 0;
         ASSERT_EQ(read(ready[0], &go, 1), 1);  // the file exists
         close(ready[0]);
-        std::uniform_int_distribution<int> delayUs(0, 80000);
+        std::uniform_int_distribution<int> delayUs(0, plan.maxDelayUs);
         usleep(static_cast<useconds_t>(delayUs(random)));
         kill(child, SIGKILL);
         int wstatus = 0;
@@ -305,9 +319,33 @@ TEST_F(RecoverTest, WritersKilledAtRandomMoments) {
         ASSERT_EQ(grdFileScan(path.c_str(), &found, &inHeader, &tail), 0);
         EXPECT_EQ(found, inHeader);
         EXPECT_EQ(tail, 0);
-        if (HasFailure()) break;
+        if (testing::Test::HasFailure()) break;
         fs::remove(path);
     }
+}
+
+TEST_F(RecoverTest, WritersKilledAtRandomMoments) {
+    KillPlan plan;
+    // Header updates between every few and every few thousand steps: the
+    // stream's buffer overflows in between, leaving unfinished steps.
+    plan.updateEvery = [](int trial) { return 97 + 400 * trial; };
+    killWriters(dir_, plan);
+    EXPECT_EQ(takeCodes(), Codes{});
+}
+
+// Writers whose header is rewritten at every step and is large (per-element
+// statistics: 2 x 1.4 MB that change at every step), so that they spend most
+// of their time writing it back: most kills fall inside that write, leaving
+// blocks part old, part new.
+TEST_F(RecoverTest, WritersKilledWhileTheirHeaderIsRewritten) {
+    KillPlan plan;
+    plan.trials = 12;
+    plan.elements = 20000;
+    plan.statsType = F_ITEM_STATS_ELEMENT;
+    plan.maxDelayUs = 150000;
+    plan.updateEvery = [](int) { return 1; };
+    plan.flushEvery = 1;
+    killWriters(dir_, plan);
     EXPECT_EQ(takeCodes(), Codes{});
 }
 

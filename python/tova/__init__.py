@@ -23,11 +23,19 @@ __version__ = "0.1.0"
 
 
 def plot_item(path, item, step=-1, **options):
-    """Draws a 2-D item of a gridded data file at one time step with
+    """Draws a 1-D or 2-D item of a gridded data file at one time step with
     matplotlib; see ``tova.plot.plot_item``."""
     from .plot import plot_item as plot
 
     return plot(path, item, step, **options)
+
+
+def plot_static(path, item, **options):
+    """Draws a 1-D or 2-D static item with matplotlib; see
+    ``tova.plot.plot_static``."""
+    from .plot import plot_static as plot
+
+    return plot(path, item, **options)
 
 
 __all__ = [
@@ -50,6 +58,7 @@ __all__ = [
     "library_paths",
     "open",
     "plot_item",
+    "plot_static",
     "units",
     "vre",
     "xsec",

@@ -151,6 +151,7 @@ public:
                                     " time steps, the file ends before its dynamic section (block 50000)"};
         }
         if (stepsSeen_ > headerSteps_) {
+            repairable_ = true;
             warnings_.push_back("the header says " + std::to_string(headerSteps_) + " time steps, the data holds " +
                              std::to_string(stepsSeen_) +
                              " complete ones: the header was not brought up to date after the last steps were "

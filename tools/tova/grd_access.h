@@ -46,8 +46,6 @@ using StaticPtr = std::unique_ptr<std::remove_pointer_t<ItemHandle>, StaticFree>
 
 // The record-file header of path; Failure unless it is a gridded data file.
 RecordFileInfo probeGridFile(const std::string& path);
-// Failure when item is given and is none of the header's items.
-void checkItemNumber(HeaderHandle header, std::optional<int32_t> item, const std::string& path);
 // Bytes of the value array of an item (elements of a simple type); Failure
 // with what as the subject when no file of fileSize bytes could fill it (a
 // compressed item is read into its whole grid, so up to 64 times the file).
@@ -129,6 +127,9 @@ struct TimeAxis {
 // The header's time axis (type 0 when it has none). The calendar getters run
 // with the modify-times flag set, so that dates already include the offset.
 TimeAxis timeAxis(HeaderHandle header);
+
+// Days since 1970-01-01 of a date of the proleptic Gregorian calendar.
+int64_t daysFromCivil(int64_t y, int64_t m, int64_t d);
 
 // The date and time of a calendar start advanced by seconds:
 // "yyyy-mm-dd hh:mm:ss", with a fraction of a second when there is one.

@@ -96,6 +96,38 @@ TEST(ToolRepair, FileCutInsideCountedStepIsDamagedButKeepsItsWholeSteps) {
     EXPECT_EQ(runTova({"check", path}).exitCode, 0);
 }
 
+// check and repair say the same of a file cut anywhere: check names repair
+// exactly when repair then changes the header, and once repair has run, check
+// finds nothing left for it (and repair agrees).
+TEST(ToolRepair, CheckAndRepairAgreeWhereverTheFileIsCut) {
+    testutil::TempDir dir;
+    const std::string whole = dir.file("whole.grd");
+    tooltest::writeGridFile(whole, 4);
+    const std::vector<uint8_t> bytes = testutil::readBytes(whole);
+    const tooltest::Layout layout = tooltest::walkLayout(whole);
+    const std::string path = dir.file("cut.grd");
+    for (size_t cut = layout.appBase + 3; cut < bytes.size(); cut += 23) {
+        testutil::writeBytes(path, std::vector<uint8_t>(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(cut)));
+        const std::string at = "cut at " + std::to_string(cut);
+        const tooltest::Run check = runTova({"check", path});
+        const bool named = has(check, "tova repair");
+        const tooltest::Run repair = runTova({"repair", path});
+        ASSERT_TRUE(check.clean() && repair.clean()) << at;
+        if (named) {
+            EXPECT_EQ(repair.exitCode, 0) << at << "\n" << check.out << repair.out;
+            EXPECT_TRUE(has(repair, "; repaired\n")) << at << "\n" << check.out << repair.out;
+        } else {
+            EXPECT_FALSE(has(repair, "; repaired\n")) << at << "\n" << check.out << repair.out;
+            EXPECT_EQ(repair.exitCode, check.exitCode) << at << "\n" << check.out << repair.out;
+        }
+        if (repair.exitCode != 0) continue;
+        const tooltest::Run after = runTova({"check", path});
+        EXPECT_EQ(after.exitCode, 0) << at << "\n" << after.out;
+        EXPECT_FALSE(has(after, "tova repair")) << at << "\n" << after.out;
+        EXPECT_TRUE(has(runTova({"repair", path}), "; nothing to repair\n")) << at;
+    }
+}
+
 TEST(ToolRepair, WhatCannotBeRepaired) {
     testutil::TempDir dir;
     const std::string vre = dir.file("a.vre");

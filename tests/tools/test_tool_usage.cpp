@@ -39,8 +39,9 @@ TEST(ToolUsage, BadCommandLinesExitWithTwoAndSayWhy) {
 TEST(ToolUsage, HelpAndVersionExitWithZero) {
     const tooltest::Run help = runTova({"--help"});
     EXPECT_EQ(help.exitCode, 0);
-    for (const char* sub : {"info", "dump", "stats", "check", "units", "demo"}) {
-        EXPECT_NE(help.out.find(sub), std::string::npos) << sub;
+    // One line per command.
+    for (const char* sub : {"info", "dump", "stats", "plot", "check", "repair", "units", "demo"}) {
+        EXPECT_NE(help.out.find("\n  " + std::string(sub) + " "), std::string::npos) << sub;
     }
     const tooltest::Run subHelp = runTova({"dump", "--help"});
     EXPECT_EQ(subHelp.exitCode, 0);

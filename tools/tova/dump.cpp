@@ -14,7 +14,7 @@
 #include "grd_access.h"
 #include "grd_commands.h"
 #include "progress.h"
-#include "select.h"
+#include "selection.h"
 #include "tova_cli.h"
 
 namespace tova_cli {
@@ -270,6 +270,7 @@ int runDump(const DumpOptions& options) {
     const FileHandle f = grid.file();
     const TimeAxis axis = timeAxis(h);
     const StepSpan steps = selectSteps(grid, axis, options.select.time, options.select.nearest, options.file);
+    if (steps.count() == 0) throw Failure(options.file + " holds no time steps");
     std::vector<Shown> shown;
     size_t largest = 8;
     for (const int32_t n : selectItems(h, options.select.items, options.file)) {

@@ -65,6 +65,27 @@ StaticPtr readStatic(FileHandle file, int32_t* status) {
     return StaticPtr(grdStaticRead(file, status));
 }
 
+double storedMean(HeaderHandle header, int32_t n) {
+    const int32_t type = grdGetItemStatsType(header);
+    if (type != F_ITEM_STATS_ELEMENT && type != F_ITEM_STATS_ELEMENT_ALT) return std::nan("");
+    double sum = 0;
+    int64_t count = 0;
+    const int32_t used = grdGetUsedItemElements(grdItemD(header, n));
+    for (int32_t e = 0; e < used; ++e) {
+        double mean = 0;
+        int32_t values = 0;
+        if (grdGetItemStats(header, n, e, nullptr, nullptr, &mean, nullptr, nullptr, &values, nullptr, nullptr) !=
+            F_NO_ERROR) {
+            return std::nan("");
+        }
+        if (values > 0) {
+            sum += mean * values;
+            count += values;
+        }
+    }
+    return count > 0 ? sum / static_cast<double>(count) : std::nan("");
+}
+
 ItemInfo itemInfo(ItemHandle item) {
     ItemInfo info;
     const char* quantityText = nullptr;

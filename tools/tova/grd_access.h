@@ -55,6 +55,10 @@ size_t valueBytes(int64_t elements, int32_t type, uint64_t fileSize, const std::
 // (*status 0) or on failure.
 StaticPtr readStatic(FileHandle file, int32_t* status);
 
+// The mean over all values of dynamic item n from the per-element means and
+// counts the file keeps (statistics types 2 and 3); NaN without them.
+double storedMean(HeaderHandle header, int32_t n);
+
 // Name, quantity and unit of an item as the unit library names them.
 struct ItemInfo {
     std::string name;

@@ -10,7 +10,7 @@
 #include <vector>
 
 #include "check.h"
-#include "select.h"
+#include "selection.h"
 #include "tova_cli.h"
 
 namespace tova_cli {

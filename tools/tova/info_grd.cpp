@@ -4,10 +4,11 @@
 // axis, the static items and the custom blocks, all read through the
 // gridded data-file API.
 #include <algorithm>
+#include <cmath>
 
 #include "grd_access.h"
 #include "grd_commands.h"
-#include "select.h"
+#include "selection.h"
 #include "tova/rcf.h"
 #include "tova_cli.h"
 
@@ -239,24 +240,18 @@ Value storedStatistics(HeaderHandle h, int32_t n, ItemHandle item) {
     int32_t deletes = 0;
     grdGetItemStatsGlobal(item, &minimum, &maximum, &deletes);
     const bool known = minimum != none && maximum != none;
-    v.add("minimum", known ? Value(minimum) : Value(nullptr));
-    v.add("maximum", known ? Value(maximum) : Value(nullptr));
+    // Extremes of a float item are floats: shown as such.
+    const bool single = itemInfo(item).dataType == RCF_FLOAT;
+    const auto extreme = [&](double d) {
+        return !known ? Value(nullptr) : single ? floatValue(static_cast<float>(d)) : Value(d);
+    };
+    v.add("minimum", extreme(minimum));
+    v.add("maximum", extreme(maximum));
     v.add("deletes", deletes);
     const int32_t type = grdGetItemStatsType(h);
     if (type == F_ITEM_STATS_ELEMENT || type == F_ITEM_STATS_ELEMENT_ALT) {
-        double sum = 0;
-        int64_t count = 0;
-        for (int32_t e = 0; e < grdGetUsedItemElements(item); ++e) {
-            double mean = 0;
-            int32_t values = 0;
-            if (grdGetItemStats(h, n, e, nullptr, nullptr, &mean, nullptr, nullptr, &values, nullptr, nullptr) != F_NO_ERROR) {
-                count = 0;
-                break;
-            }
-            sum += values > 0 ? mean * values : 0;
-            count += std::max(values, 0);
-        }
-        v.add("mean", count > 0 ? Value(sum / static_cast<double>(count)) : Value(nullptr));
+        const double mean = storedMean(h, n);
+        v.add("mean", std::isfinite(mean) ? Value(mean) : Value(nullptr));
     }
     return v;
 }
@@ -267,6 +262,9 @@ Value storedStatistics(HeaderHandle h, int32_t n, ItemHandle item) {
 bool endsWhereHeaderSays(const GridFile& grid, const RecordFileInfo& file) {
     const HeaderHandle h = grid.header();
     const FileHandle f = grid.file();
+    // Only the file types with fixed spatial data have time steps of one length.
+    const int32_t type = grdGetFileType(h);
+    if (type != F_EQTIME_FIXEDSPACE_ALLITEMS && type != F_NEQTIME_FIXEDSPACE_ALLITEMS) return true;
     const int32_t steps = timeAxis(h).timeSteps;
     if (grdFindTimeStep(h, f, steps) != F_NO_ERROR) return false;
     return rcfPeekError(f) == F_NO_ERROR && rcfTell64(f) == static_cast<int64_t>(file.size);

@@ -34,14 +34,16 @@ int runPlot(const std::vector<std::string>& args) {
     std::vector<std::string> command{interpreter(), "-m", "tova", "plot"};
     command.insert(command.end(), args.begin(), args.end());
     std::vector<std::string> environment;
-#if defined(TOVA_CLI_BUILD_DIR) && defined(TOVA_CLI_PYTHON_DIR) && defined(TOVA_CLI_LIBRARY_DIR)
+#if defined(TOVA_CLI_BUILD_DIR) && defined(TOVA_CLI_PYTHON_DIR)
     if (sameFolder(programFolder(), TOVA_CLI_BUILD_DIR)) {
         const char* path = std::getenv("PYTHONPATH");
         environment.push_back(std::string("PYTHONPATH=") + TOVA_CLI_PYTHON_DIR +
                               (path != nullptr && *path != '\0' ? std::string(1, kPathListSeparator) + path : ""));
+#ifdef TOVA_CLI_LIBRARY_DIR
         if (std::getenv("TOVA_LIBRARY_DIR") == nullptr) {
             environment.push_back(std::string("TOVA_LIBRARY_DIR=") + TOVA_CLI_LIBRARY_DIR);
         }
+#endif
     }
 #endif
     std::string error;

@@ -14,7 +14,7 @@
 #include "grd_access.h"
 #include "grd_commands.h"
 #include "progress.h"
-#include "select.h"
+#include "selection.h"
 #include "text.h"
 #include "tova_cli.h"
 
@@ -128,28 +128,7 @@ Value stored(HeaderHandle h, int32_t n, const Accumulator& acc, bool* agrees) {
     grdGetItemStatsGlobal(item, &minimum, &maximum, &deletes);
     const bool hasExtremes = minimum != none && maximum != none;
 
-    // The mean over all values from the per-element means and counts.
-    double mean = std::nan("");
-    const int32_t type = grdGetItemStatsType(h);
-    if (type == F_ITEM_STATS_ELEMENT || type == F_ITEM_STATS_ELEMENT_ALT) {
-        double sum = 0;
-        int64_t count = 0;
-        const int32_t used = grdGetUsedItemElements(item);
-        for (int32_t e = 0; e < used; ++e) {
-            double elementMean = 0;
-            int32_t values = 0;
-            if (grdGetItemStats(h, n, e, nullptr, nullptr, &elementMean, nullptr, nullptr, &values, nullptr, nullptr) !=
-                F_NO_ERROR) {
-                count = 0;
-                break;
-            }
-            if (values > 0) {
-                sum += elementMean * values;
-                count += values;
-            }
-        }
-        if (count > 0) mean = sum / static_cast<double>(count);
-    }
+    const double mean = storedMean(h, n);
 
     *agrees = deletes == acc.deletes && (hasExtremes ? minimum == acc.minimum && maximum == acc.maximum : acc.values == 0);
     if (std::isfinite(mean) && acc.values > 0) {

@@ -1,5 +1,5 @@
-// Selection of items, time steps and cells (see select.h).
-#include "select.h"
+// Selection of items, time steps and cells (see selection.h).
+#include "selection.h"
 
 #include <algorithm>
 #include <cctype>
@@ -248,8 +248,8 @@ StepSpan stepAtDate(StepTimes& times, double when, bool nearest, const std::stri
 StepSpan selectSteps(const GridFile& grid, const TimeAxis& axis, const std::optional<std::string>& text, bool nearest,
                      const std::string& path) {
     const int64_t n = axis.timeSteps;
-    if (n <= 0) throw Failure(path + " holds no time steps");
     if (!text) return {0, n - 1};
+    if (n <= 0) throw Failure(path + " holds no time steps");
     if (const auto range = parseRange(*text)) {
         const auto outside = [&](int64_t index) {
             return Failure(path + " holds time steps 0 to " + std::to_string(n - 1) + "; time step " +
@@ -297,6 +297,7 @@ StepSpan selectSteps(const GridFile& grid, const TimeAxis& axis, const std::opti
 Box::Box(const Geometry& g, const std::array<std::optional<std::string>, 3>& axes, const std::string& label) {
     static const char* const kNames[] = {"x", "y", "z"};
     for (int32_t d = 0; d < std::min(g.dims, 4); ++d) size_[d] = std::max(g.size[d], 0);
+    if (g.elements == 0) size_[0] = 0;  // an undefined axis holds no values
     for (int d = 0; d < 4; ++d) hi_[d] = size_[d] - 1;
     for (int d = 0; d < 3; ++d) {
         if (!axes[static_cast<size_t>(d)]) continue;
@@ -334,6 +335,7 @@ int64_t Box::count() const {
 
 bool Box::contains(int64_t e) const {
     for (int d = 0; d < 4; ++d) {
+        if (size_[d] <= 0) return false;
         const int64_t i = e % size_[d];
         if (i < lo_[d] || i > hi_[d]) return false;
         e /= size_[d];

@@ -34,6 +34,8 @@ TEST(ToolUsage, BadCommandLinesExitWithTwoAndSayWhy) {
         EXPECT_TRUE(run.out.empty()) << line;
     }
     EXPECT_NE(runTova({"frobnicate"}).err.find("frobnicate"), std::string::npos);
+    EXPECT_NE(runTova({"dump", "f", "--limit", "-1"}).err.find("--limit: a number of values, 0 or more: -1"),
+              std::string::npos);
 }
 
 TEST(ToolUsage, HelpAndVersionExitWithZero) {

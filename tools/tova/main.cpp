@@ -47,6 +47,15 @@ std::string rangeSyntax(const std::string& text) {
     return {};
 }
 
+// A count of 0 or more (CLI11's own range check would name the largest double).
+std::string countSyntax(const std::string& text) {
+    const auto range = parseRange(text);
+    if (!range || !range->first || range->first != range->last || *range->first < 0) {
+        return "a number of values, 0 or more: " + text;
+    }
+    return {};
+}
+
 // The selection options of dump and stats.
 void addSelection(CLI::App* cmd, Selection& select) {
     cmd->add_option("--item", select.items,
@@ -100,7 +109,7 @@ int run(int argc, char** argv) {
         ->excludes("--nearest");
     dumpCmd->add_option("--format", dumpFormat, "text or csv")->check(CLI::IsMember({"text", "csv"}));
     dumpCmd->add_option("--limit", dump.limit, "at most N values per item and time step")
-        ->check(CLI::NonNegativeNumber);
+        ->check(CLI::Validator(countSyntax, "N"));
 
     StatsOptions stats;
     CLI::App* statsCmd =

@@ -41,6 +41,7 @@ def test_items_by_name_beginning_or_case(calendar):
 def test_time_steps_by_date(calendar):
     with tova.open(calendar) as f:
         assert f.find_step("2024-03-21T08:00") == 2
+        np.testing.assert_array_equal(f.read("water d", "2024-03-21T08:00"), f.read(1, 2))
         assert f.find_step(np.datetime64("2024-03-21T08:20"), nearest=True) == 2
         with pytest.raises(ValueError, match=r"no time step at 2024-03-21 08:20:00: the nearest are time step 2 "
                                              r"\(2024-03-21 08:00:00\) and time step 3"):

@@ -748,6 +748,8 @@ class GridFile(_OpenFile):
         n = self.n_steps
         if steps is None:
             return np.arange(n, dtype=np.int64), False
+        if isinstance(steps, str):  # a date of a calendar axis, as the tool takes it
+            return np.array([self.find_step(steps)], dtype=np.int64), True
         if isinstance(steps, slice):
             return np.arange(n, dtype=np.int64)[steps], False
         if np.ndim(steps) == 0:
@@ -793,9 +795,10 @@ class GridFile(_OpenFile):
         return values
 
     def read(self, item, steps=None, *, mask: bool | None = None) -> np.ndarray:
-        """The values of an item at the given time steps: an integer step
-        gives one array of the item's shape; None (all), a slice or a sequence
-        of steps gives an array with the steps first. Each step is one jump
+        """The values of an item at the given time steps: an integer step (or
+        the date of one, "2024-03-22T06:00") gives one array of the item's
+        shape; None (all), a slice or a sequence of steps gives an array with
+        the steps first. Each step is one jump
         and one read straight into the result."""
         lib, h, f = self._handles()
         item = self.item(item)

@@ -50,6 +50,8 @@ TEST(ToolRepair, CrashedFileIsRepairable) {
     EXPECT_TRUE(has(run, path + ": header says 2 time steps, file holds 3 complete steps and a partial one")) << run.out;
     EXPECT_TRUE(has(run, "; would repair\n")) << run.out;
     EXPECT_EQ(testutil::readBytes(path), crashed);
+    // info shows the header as it is, with what check says of it.
+    EXPECT_TRUE(has(runTova({"info", path}), "\nwarning: the header says 2 time steps, the data holds 3 complete ones"));
 
     run = runTova({"repair", path});
     EXPECT_EQ(run.exitCode, 0) << run.out;

@@ -20,14 +20,18 @@ namespace {
 
 using namespace tova_cli;
 
+std::string rangeSyntax(const std::string& text) {
+    const auto range = parseRange(text);
+    if (!range) return "not an index or a range A:B: " + text;
+    if (range->first && range->last && *range->first >= 0 && *range->last >= 0 && *range->last < *range->first) {
+        return "the range " + text + " ends before it begins";
+    }
+    return {};
+}
+
 // The forms --time takes: a time step, a range, a date or two joined by "/".
 std::string timeSyntax(const std::string& text) {
-    if (const auto range = parseRange(text)) {
-        if (range->first && range->last && *range->first >= 0 && *range->last >= 0 && *range->last < *range->first) {
-            return "the range " + text + " ends before it begins";
-        }
-        return {};
-    }
+    if (parseRange(text)) return rangeSyntax(text);
     const size_t slash = text.find('/');
     const auto dateOrEmpty = [](const std::string& part) { return part.empty() || parseDateTime(part).has_value(); };
     if (slash != std::string::npos && text != "/" && dateOrEmpty(text.substr(0, slash)) &&
@@ -36,15 +40,6 @@ std::string timeSyntax(const std::string& text) {
     }
     if (slash == std::string::npos && parseDateTime(text)) return {};
     return "not a time step, a range A:B or a date (2024-03-22T06:00, or two joined by /): " + text;
-}
-
-std::string rangeSyntax(const std::string& text) {
-    const auto range = parseRange(text);
-    if (!range) return "not an index or a range A:B: " + text;
-    if (range->first && range->last && *range->first >= 0 && *range->last >= 0 && *range->last < *range->first) {
-        return "the range " + text + " ends before it begins";
-    }
-    return {};
 }
 
 // A count of 0 or more (CLI11's own range check would name the largest double).

@@ -29,8 +29,6 @@ struct Selection {
     std::optional<std::string> time;                 // number, range, date or "date/date"
     bool nearest = false;                            // a date takes the nearest time step
     std::array<std::optional<std::string>, 3> axes;  // --x, --y, --z
-    // Whether anything narrows the time steps or the cells.
-    bool narrowsCells() const { return axes[0] || axes[1] || axes[2]; }
 };
 
 // The 1-based number of key among names: a number in range, else the name

@@ -108,7 +108,7 @@ TEST(ToolRepair, CheckAndRepairAgreeWhereverTheFileIsCut) {
     const std::vector<uint8_t> bytes = testutil::readBytes(whole);
     const tooltest::Layout layout = tooltest::walkLayout(whole);
     const std::string path = dir.file("cut.grd");
-    for (size_t cut = layout.appBase + 3; cut < bytes.size(); cut += 23) {
+    for (size_t cut = layout.appBase + 3; cut < bytes.size(); cut += 31) {
         testutil::writeBytes(path, std::vector<uint8_t>(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(cut)));
         const std::string at = "cut at " + std::to_string(cut);
         const tooltest::Run check = runTova({"check", path});

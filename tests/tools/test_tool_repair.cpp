@@ -108,7 +108,17 @@ TEST(ToolRepair, CheckAndRepairAgreeWhereverTheFileIsCut) {
     const std::vector<uint8_t> bytes = testutil::readBytes(whole);
     const tooltest::Layout layout = tooltest::walkLayout(whole);
     const std::string path = dir.file("cut.grd");
-    for (size_t cut = layout.appBase + 3; cut < bytes.size(); cut += 31) {
+    // Cuts every 31 bytes from the header on, and at every record and block
+    // boundary of the time steps (each a 50001 block of 4 bytes, a float
+    // record of 12 and a double record of 5: 102 bytes).
+    std::vector<size_t> cuts;
+    for (size_t cut = layout.appBase + 3; cut < bytes.size(); cut += 31) cuts.push_back(cut);
+    for (const int64_t b : layout.boundaries) {
+        if (b >= static_cast<int64_t>(bytes.size()) - 4 * 102 - 4 && b < static_cast<int64_t>(bytes.size())) {
+            cuts.push_back(static_cast<size_t>(b));
+        }
+    }
+    for (const size_t cut : cuts) {
         testutil::writeBytes(path, std::vector<uint8_t>(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(cut)));
         const std::string at = "cut at " + std::to_string(cut);
         const tooltest::Run check = runTova({"check", path});

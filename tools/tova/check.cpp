@@ -359,8 +359,9 @@ Diagnosis diagnose(const std::string& path) {
         d.damaged = true;
         d.lines.push_back(damagedLine(path, *problem));
         // Data lost at the end of a gridded file (a copy cut short, a disk
-        // that filled up): what is whole before it can still be kept.
-        if (scanned && found < inHeader) {
+        // that filled up): what is whole before it can still be kept. Damage
+        // before the time steps stays whatever the header counts.
+        if (scanned && found < inHeader && kind != nullptr && kind->beforeStepsWhole()) {
             d.repairable = true;
             d.lines.push_back("note: the header counts " + std::to_string(inHeader) + " time steps, " +
                               std::to_string(found) + " are whole: `tova repair " + path +

@@ -46,6 +46,9 @@ public:
     const std::vector<std::string>& warnings() const { return warnings_; }
     // Whether `tova repair` would bring the file up to date.
     bool repairable() const { return repairable_; }
+    // Whether everything before the time steps was whole where the walk
+    // stopped: damage after that point loses time steps only.
+    virtual bool beforeStepsWhole() const { return false; }
 
 protected:
     bool repairable_ = false;

@@ -1,4 +1,4 @@
-/*
+/** @file
  * tova — the interface of extension plug-ins, for their authors.
  *
  * An extension plug-in is a shared library that offers derived items for the
@@ -60,79 +60,103 @@
 
 /* Visibility of a plug-in's entry points. */
 #if defined(_WIN32)
+/** Marks a plug-in's entry points as exported from the plug-in library. */
 #define GRD_EXT_EXPORT __declspec(dllexport)
 #elif defined(__GNUC__)
+/** Marks a plug-in's entry points as exported from the plug-in library. */
 #define GRD_EXT_EXPORT __attribute__((visibility("default")))
 #else
+/** Marks a plug-in's entry points as exported from the plug-in library. */
 #define GRD_EXT_EXPORT
 #endif
 
-/* The exported names, as the library looks them up. */
+/** The exported names, as the library looks them up. */
 #define GRD_EXT_INITIALIZE "grdExtInitialize"
+/** Exported name of grdExtTerminate. */
 #define GRD_EXT_TERMINATE "grdExtTerminate"
+/** Exported name of grdExtGetNoOfItems. */
 #define GRD_EXT_GET_NO_OF_ITEMS "grdExtGetNoOfItems"
+/** Exported name of grdExtGetItemInfo. */
 #define GRD_EXT_GET_ITEM_INFO "grdExtGetItemInfo"
+/** Exported name of grdExtGetItemAxisType. */
 #define GRD_EXT_GET_ITEM_AXIS_TYPE "grdExtGetItemAxisType"
+/** Exported name of grdExtGetItemAxisEq. */
 #define GRD_EXT_GET_ITEM_AXIS_EQ "grdExtGetItemAxisEq"
+/** Exported name of grdExtIsItemDerived. */
 #define GRD_EXT_IS_ITEM_DERIVED "grdExtIsItemDerived"
+/** Exported name of grdExtGetItemStatsGlobal. */
 #define GRD_EXT_GET_ITEM_STATS_GLOBAL "grdExtGetItemStatsGlobal"
+/** Exported name of grdExtGetItemValueType. */
 #define GRD_EXT_GET_ITEM_VALUE_TYPE "grdExtGetItemValueType"
+/** Exported name of grdExtNewTimeStep. */
 #define GRD_EXT_NEW_TIME_STEP "grdExtNewTimeStep"
+/** Exported name of grdExtReadItemTimeStep. */
 #define GRD_EXT_READ_ITEM_TIME_STEP "grdExtReadItemTimeStep"
 
 TOVA_EXTERN_C_BEGIN
 
-/* Prepares the plug-in for this header and file; non-zero refuses it. */
+/** Prepares the plug-in for this header and file; non-zero refuses it. */
 typedef int(TOVA_CALL* grdExtInitializeFn)(HeaderHandle header, FileHandle file);
-/* Releases what the plug-in keeps for this header; the result is what
+/** Releases what the plug-in keeps for this header; the result is what
  * grdUnloadPlugin returns. */
 typedef int(TOVA_CALL* grdExtTerminateFn)(HeaderHandle header);
-/* Number of items offered (at least 1). */
+/** Number of items offered (at least 1). */
 typedef int(TOVA_CALL* grdExtGetNoOfItemsFn)(HeaderHandle header);
-/* Describes item itemNo: quantity type, name, unit key, unit text, simple
+/** Describes item itemNo: quantity type, name, unit key, unit text, simple
  * type of the values (1-7) and a further name that the library does not use.
  * On 0 the library takes the values and copies both texts (a null text keeps
  * the item's). */
 typedef int(TOVA_CALL* grdExtGetItemInfoFn)(HeaderHandle header, int32_t itemNo, int32_t* itemType,
                                             const char** name, int32_t* unit, const char** unitName,
                                             int32_t* dataType, const char** otherName);
-/* 0-3: the item gets the equidistant axis of that dimension (EqD0 ... EqD3);
+/** 0-3: the item gets the equidistant axis of that dimension (EqD0 ... EqD3);
  * a negative value keeps the item's axis as copied; above 3 refuses the
  * plug-in. */
 typedef int(TOVA_CALL* grdExtGetItemAxisTypeFn)(HeaderHandle header, int32_t itemNo);
-/* Fills the equidistant axis given by grdExtGetItemAxisType (called only for
+/** Fills the equidistant axis given by grdExtGetItemAxisType (called only for
  * 0-3): axis unit, and per direction size, origin and step, in the axis unit.
  * On 0 the library takes them; a size below 1 refuses the plug-in. */
 typedef int(TOVA_CALL* grdExtGetItemAxisEqFn)(HeaderHandle header, int32_t itemNo, int32_t* unit,
                                               int32_t sizes[3], float starts[3], float steps[3]);
-/* Non-zero: the item's values are computed by the plug-in. */
+/** Non-zero: the item's values are computed by the plug-in. */
 typedef int(TOVA_CALL* grdExtIsItemDerivedFn)(HeaderHandle header, int32_t itemNo);
-/* Preset item-global statistics (grdGetItemStatsGlobal); taken on 0. */
+/** Preset item-global statistics (grdGetItemStatsGlobal); taken on 0. */
 typedef int(TOVA_CALL* grdExtGetItemStatsGlobalFn)(HeaderHandle header, int32_t itemNo, double* minimum,
                                                    double* maximum, int32_t* deleteCount);
-/* The item's value type (grdGetItemValueType); taken when 0-3. */
+/** The item's value type (grdGetItemValueType); taken when 0-3. */
 typedef int(TOVA_CALL* grdExtGetItemValueTypeFn)(HeaderHandle header, int32_t itemNo);
-/* Called before the first item of every time step read or skipped. */
+/** Called before the first item of every time step read or skipped. */
 typedef int(TOVA_CALL* grdExtNewTimeStepFn)(HeaderHandle header, FileHandle file);
-/* Writes the values of the item under the cursor (grdGetItemCursor) into
+/** Writes the values of the item under the cursor (grdGetItemCursor) into
  * data; data is null when the caller skips the item. */
 typedef int(TOVA_CALL* grdExtReadItemTimeStepFn)(HeaderHandle header, FileHandle file, void* data);
 
 /* The entry points as a plug-in defines them. */
+/** Entry point of a plug-in (optional): see grdExtInitializeFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtInitialize(HeaderHandle header, FileHandle file);
+/** Entry point of a plug-in (optional): see grdExtTerminateFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtTerminate(HeaderHandle header);
+/** Entry point of a plug-in (required): see grdExtGetNoOfItemsFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtGetNoOfItems(HeaderHandle header);
+/** Entry point of a plug-in (required): see grdExtGetItemInfoFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtGetItemInfo(HeaderHandle header, int32_t itemNo, int32_t* itemType,
                                                const char** name, int32_t* unit, const char** unitName,
                                                int32_t* dataType, const char** otherName);
+/** Entry point of a plug-in (optional): see grdExtGetItemAxisTypeFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtGetItemAxisType(HeaderHandle header, int32_t itemNo);
+/** Entry point of a plug-in (optional): see grdExtGetItemAxisEqFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtGetItemAxisEq(HeaderHandle header, int32_t itemNo, int32_t* unit,
                                                  int32_t sizes[3], float starts[3], float steps[3]);
+/** Entry point of a plug-in (required): see grdExtIsItemDerivedFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtIsItemDerived(HeaderHandle header, int32_t itemNo);
+/** Entry point of a plug-in (optional): see grdExtGetItemStatsGlobalFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtGetItemStatsGlobal(HeaderHandle header, int32_t itemNo, double* minimum,
                                                       double* maximum, int32_t* deleteCount);
+/** Entry point of a plug-in (optional): see grdExtGetItemValueTypeFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtGetItemValueType(HeaderHandle header, int32_t itemNo);
+/** Entry point of a plug-in (required): see grdExtNewTimeStepFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtNewTimeStep(HeaderHandle header, FileHandle file);
+/** Entry point of a plug-in (required): see grdExtReadItemTimeStepFn. */
 GRD_EXT_EXPORT int TOVA_CALL grdExtReadItemTimeStep(HeaderHandle header, FileHandle file, void* data);
 
 TOVA_EXTERN_C_END

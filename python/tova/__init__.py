@@ -5,7 +5,11 @@ Gridded data files: ``tova.open(path)`` reads one (``GridFile``),
 ``tova.create(path, items, time_axis)`` writes one (``GridWriter``);
 ``tova.plot_item`` draws an item at a time step. With xarray installed,
 ``xarray.open_dataset(path, engine="tova")`` opens one lazily
-(``tova.xarray_backend``).
+(``tova.xarray_backend``) with CF attributes (``tova.cf``), and
+``tova.to_grd(ds, path)`` (or ``ds.tova.to_grd(path)`` once xarray is
+imported) writes a CF-style Dataset as one (``tova.writer``);
+``python3 -m tova convert IN OUT`` converts between netCDF and gridded data
+files (``tova.convert``).
 
 Submodules: ``grd`` (gridded data files), ``units`` (quantities, units,
 conversions), ``vre`` (VRE files), ``xsec`` (cross-section files), ``errors``
@@ -13,13 +17,20 @@ conversions), ``vre`` (VRE files), ``xsec`` (cross-section files), ``errors``
 describes and loaded on first use.
 """
 
-from . import errors, grd, units, vre, xsec
+import sys
+
+from . import errors, grd, units, vre, writer, xsec
 from ._lib import ENV_VAR, LibraryNotFoundError, library_paths
 from .errors import TovaError, UnitError
 from .grd import (Axis, CustomBlock, DeleteValues, GridFile, GridWriter, Item, Projection, StaticItem, TimeAxis,
                   create, open)
 
+from .writer import to_grd
+
 __version__ = "0.1.0"
+
+if "xarray" in sys.modules:  # the accessor needs xarray; importing it here would slow every start
+    writer.register_accessor()
 
 
 def plot_item(path, item, step=-1, **options):
@@ -59,6 +70,7 @@ __all__ = [
     "open",
     "plot_item",
     "plot_static",
+    "to_grd",
     "units",
     "vre",
     "xsec",

@@ -1,24 +1,30 @@
-"""``python -m tova COMMAND ...``: the commands of the package that the
-``tova`` tool hands over to Python. Each is a module of the package with a
-``main(argv)`` that returns the exit status."""
+"""``python3 -m tova COMMAND ...``: the package's commands, which the
+``tova`` tool hands over to Python. Each command is a module with
+``main(argv) -> exit status``; ``COMMANDS`` lists them."""
+
+from __future__ import annotations
 
 import importlib
 import sys
 
-# Command -> module (relative to the package) and a line for the listing.
+# name -> (module, one line of help)
 COMMANDS = {
-    "plot": (".plot", "picture of an item at a time step (PNG)"),
+    "convert": ("tova.convert", "convert between netCDF (CF) and gridded data files"),
+    "plot": ("tova.plot", "picture of an item at a time step (PNG)"),
 }
 
 
 def main(argv=None) -> int:
-    argv = sys.argv[1:] if argv is None else list(argv)
-    if not argv or argv[0] not in COMMANDS:
-        listing = "\n".join(f"  {name:8} {line}" for name, (_, line) in COMMANDS.items())
-        print(f"usage: python -m tova COMMAND ...\ncommands:\n{listing}", file=sys.stderr)
+    argv = list(sys.argv[1:] if argv is None else argv)
+    if not argv or argv[0] in ("-h", "--help"):
+        lines = [f"  {name:10s} {text}" for name, (_, text) in COMMANDS.items()]
+        print("usage: python3 -m tova COMMAND [ARGS...]\n\ncommands:\n" + "\n".join(lines))
+        return 0 if argv else 2
+    command = COMMANDS.get(argv[0])
+    if command is None:
+        print(f"tova: unknown command {argv[0]!r} ({', '.join(COMMANDS)})", file=sys.stderr)
         return 2
-    module = importlib.import_module(COMMANDS[argv[0]][0], __package__ or "tova")
-    return module.main(argv[1:])
+    return importlib.import_module(command[0]).main(argv[1:])
 
 
 if __name__ == "__main__":

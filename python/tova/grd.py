@@ -882,6 +882,20 @@ def _values(values, item: Item, what: str) -> np.ndarray:
     return np.ascontiguousarray(src, dtype=item.dtype)
 
 
+def _nan_as_delete(values: np.ndarray, src, marker) -> np.ndarray:
+    """Float values with NaN replaced by the file's delete value, so that
+    every reader sees "no value" there; the caller's array is not changed."""
+    if values.dtype.kind != "f" or marker is None:
+        return values
+    nan = np.isnan(values)
+    if not nan.any():
+        return values
+    if np.shares_memory(values, np.asarray(src)):
+        values = values.copy()
+    values[nan] = marker
+    return values
+
+
 def _set_time_axis(lib, header, axis: TimeAxis, what: str) -> None:
     unit = units.unit(axis.unit).key
     if axis.kind == 1:
@@ -1007,6 +1021,7 @@ class GridWriter(_OpenFile):
         try:
             check(lib.grdStaticSetHeader(self._header, handle), what)
             _set_item(lib, self._header, handle, item, what)
+            values = _nan_as_delete(values, item.values, self.delete_values.for_dtype(item.dtype))
             check(lib.grdStaticWrite(handle, self._file, values.ctypes.data), what)
         finally:
             lib.grdStaticDestroy(byref(handle))
@@ -1048,7 +1063,8 @@ class GridWriter(_OpenFile):
         if len(values) != len(self.items):
             raise TovaError(F_ERR_SIZE, self.path, f"{len(values)} arrays for {len(self.items)} items")
         step = self.steps_written
-        arrays = [_values(v, it, f"{self.path}: item {it.name!r} of time step {step}")
+        arrays = [_nan_as_delete(_values(v, it, f"{self.path}: item {it.name!r} of time step {step}"), v,
+                                 self.delete_values.for_dtype(it.dtype))
                   for v, it in zip(values, self.items)]
         t = self._time(time)
         lib, h, f = self._handles()

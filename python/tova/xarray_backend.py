@@ -26,6 +26,7 @@ import xarray as xr
 from xarray.backends import BackendArray, BackendEntrypoint, CachingFileManager
 from xarray.core import indexing
 
+from . import cf, writer
 from .errors import TovaError
 from .grd import Axis, GridFile
 
@@ -148,28 +149,32 @@ def open_tova_dataset(path, *, mask_and_scale: bool = True, decode_times: bool =
         grids = _Grids()
         coords = {"time": _time_coordinate(f, decode_times)}
         variables = {}
+        meta = cf.metadata_of(f.custom_blocks)
         for index, item in enumerate(f.items):
+            masked = mask_and_scale and cf.masked(meta, "item", item.number) is not False
             dims = ("time",) + grids.dims(item.axis)
             name = _unique(item.name, variables.keys() | grids.coords.keys() | {"time"}, f"{item.name}_{item.number}")
             if name in drop:
                 continue
-            dtype = f.masked_dtype(item) if mask_and_scale else item.dtype
+            dtype = f.masked_dtype(item) if masked else item.dtype
             lazy = indexing.LazilyIndexedArray(
-                TovaBackendArray(manager, index, (f.n_steps,) + item.shape, dtype, mask_and_scale))
+                TovaBackendArray(manager, index, (f.n_steps,) + item.shape, dtype, masked))
             variables[name] = xr.Variable(dims, lazy, _item_attrs(f, item, tova_item=item.number),
-                                          _encoding(f, item, mask_and_scale))
+                                          _encoding(f, item, masked))
         if static_items:
             for item in f.static_items:
                 dims = grids.dims(item.axis)
                 name = _unique(item.name, variables.keys() | grids.coords.keys() | {"time"}, f"{item.name}_static")
                 if name in drop:
                     continue
-                values = f.mask_values(item, item.values.copy()) if mask_and_scale else item.values
+                masked = mask_and_scale and cf.masked(meta, "static", item.number) is not False
+                values = f.mask_values(item, item.values.copy()) if masked else item.values
                 variables[name] = xr.Variable(dims, values, _item_attrs(f, item, tova_static_item=item.number),
-                                              _encoding(f, item, mask_and_scale))
+                                              _encoding(f, item, masked))
         coords.update(grids.coords)
         ds = xr.Dataset(variables, coords={k: v for k, v in coords.items() if k not in drop},
                         attrs=_global_attrs(f))
+        ds = cf.decorate(ds, f, decode_times=decode_times)
     except BaseException:
         manager.close()
         raise
@@ -218,5 +223,7 @@ class TovaBackendEntrypoint(BackendEntrypoint):
         except OSError:
             return False
 
+
+writer.register_accessor()
 
 __all__ = ["TovaBackendArray", "TovaBackendEntrypoint", "open_tova_dataset"]

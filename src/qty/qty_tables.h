@@ -46,6 +46,7 @@ inline constexpr Dim kInertia = kMass * kArea;
 inline constexpr Dim kAngularVelocity = kAngle / kTime;
 inline constexpr Dim kWaveNumber = kAngle / kLength;
 inline constexpr Dim kHeatFlux = kForce * kVelocity / kArea;  // W/m^2
+inline constexpr Dim kMassFlux = kMassRate / kArea;             // precipitation as a mass flux
 }  // namespace dim
 
 // ---- Exact definitions, in coherent SI units --------------------------------
@@ -105,6 +106,7 @@ enum UnitKey : int32_t {
     kRadianPerSecond = 21900, kDegreePerSecond, kRevolutionPerMinute,
     kRadianPerMetre = 22000, kRadianPerFoot,
     kWattPerSquareMetre = 22100, kKilowattPerSquareMetre,
+    kKilogramPerSquareMetrePerSecond = 22200, kKilogramPerSquareMetrePerDay, kGramPerSquareMetrePerSecond,
 };
 
 constexpr Unit unit(int32_t key, const char* text, const char* description, Dim d, Rat scale, int piPower = 0,
@@ -267,6 +269,12 @@ inline constexpr Unit kUnits[] = {
 
     unit(kWattPerSquareMetre, "W/m^2", "watt per square metre", dim::kHeatFlux, def::kOne),
     unit(kKilowattPerSquareMetre, "kW/m^2", "kilowatt per square metre", dim::kHeatFlux, rat(1000)),
+
+    unit(kKilogramPerSquareMetrePerSecond, "kg/m^2/s", "kilogram per square metre and second", dim::kMassFlux,
+         def::kOne),
+    unit(kKilogramPerSquareMetrePerDay, "kg/m^2/day", "kilogram per square metre and day", dim::kMassFlux,
+         rat(1) / def::kDay),
+    unit(kGramPerSquareMetrePerSecond, "g/m^2/s", "gram per square metre and second", dim::kMassFlux, rat(1, 1000)),
 };
 
 // Further spellings found in data files and typed by users. Symbols are
@@ -346,6 +354,8 @@ inline constexpr int32_t kAngularVelocity[] = {kRadianPerSecond, kDegreePerSecon
 inline constexpr int32_t kWaveAngularFrequency[] = {kRadianPerSecond, kDegreePerSecond};
 inline constexpr int32_t kWaveNumber[] = {kRadianPerMetre, kRadianPerFoot};
 inline constexpr int32_t kHeatFlux[] = {kWattPerSquareMetre, kKilowattPerSquareMetre};
+inline constexpr int32_t kMassFlux[] = {kKilogramPerSquareMetrePerSecond, kKilogramPerSquareMetrePerDay,
+                                        kGramPerSquareMetrePerSecond};
 }  // namespace seq
 
 // ---- Quantity types ------------------------------------------------------------
@@ -403,6 +413,7 @@ inline constexpr Quantity kQuantities[] = {
     {40509, "Precipitation", "Precipitation depth", dim::kLength, seq::kRainDepth},
     {40510, "RelativeHumidity", "Relative humidity", dim::kNone, seq::kHumidity},
     {40511, "SolarRadiation", "Solar radiation (irradiance)", dim::kHeatFlux, seq::kHeatFlux},
+    {40512, "PrecipitationFlux", "Precipitation as a mass flux", dim::kMassFlux, seq::kMassFlux},
 
     {40601, "Length", "Length", dim::kLength, seq::kLength},
     {40602, "Area", "Area", dim::kArea, seq::kArea},
@@ -417,6 +428,7 @@ inline constexpr Quantity kQuantities[] = {
     {40611, "Acceleration", "Acceleration", dim::kAcceleration, seq::kAcceleration},
     {40612, "Force", "Force", dim::kForce, seq::kForce},
     {40613, "AngularVelocity", "Angular velocity", dim::kAngularVelocity, seq::kAngularVelocity},
+    {40614, "MassFlux", "Mass flux (mass per area and time)", dim::kMassFlux, seq::kMassFlux},
 
     // Panel-body response quantities. The file fixes only key and element
     // count of each item; the meaning is our reading of those counts

@@ -144,11 +144,16 @@ int run(int argc, char** argv) {
     CLI::App* demoCmd = app.add_subcommand("demo", "Write a sample gridded data file");
     demoCmd->add_option("OUT", demo.out, "the file to write")->capture_default_str();
 
+    CLI::App* convertCmd = app.add_subcommand(
+        "convert", "Convert netCDF (CF) to a gridded data file or back (python3 -m tova convert)");
+    convertCmd->set_help_flag();  // --help goes to the converter with the other arguments
+    convertCmd->prefix_command();
+
     // CLI11 would call an unknown subcommand a stray argument; name it.
     if (argc > 1 && argv[1][0] != '-' &&
         app.get_subcommands([&](CLI::App* sub) { return sub->get_name() == argv[1]; }).empty()) {
         std::fprintf(stderr,
-                     "tova: unknown subcommand \"%s\" (info, dump, stats, plot, check, repair, units, demo)\n"
+                     "tova: unknown subcommand \"%s\" (info, dump, stats, plot, check, repair, units, demo, convert)\n"
                      "Run with --help for more information.\n",
                      argv[1]);
         return kExitUsage;
@@ -175,6 +180,7 @@ int run(int argc, char** argv) {
     if (statsCmd->parsed()) return runStats(stats);
     if (plotCmd->parsed()) return runPlot(plotCmd->remaining());
     if (demoCmd->parsed()) return runDemo(demo);
+    if (convertCmd->parsed()) return runConvert(convertCmd->remaining());
     return kExitUsage;
 }
 

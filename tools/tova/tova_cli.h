@@ -7,6 +7,7 @@
 #include <optional>
 #include <stdexcept>
 #include <string>
+#include <vector>
 
 #include "json.h"
 
@@ -83,6 +84,9 @@ struct UnitsOptions {
     bool json = false;
 };
 int runUnits(const UnitsOptions& options);
+
+// `convert`: runs the Python package's converter with these arguments.
+int runConvert(const std::vector<std::string>& args);
 
 // Kind-specific parts of `info`. Each returns the member to add under the
 // kind's id; Failure when the library cannot read the file.

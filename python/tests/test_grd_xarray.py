@@ -188,5 +188,7 @@ def test_plot_item_draws_a_time_step(sample, tmp_path):
     assert "water_level" in ax.get_title() and "step 3" in ax.get_title()
     np.testing.assert_array_equal(ax.collections[0].get_array().mask.reshape(3, 4),
                                   np.isnan(_expected("water_level")[3]))
-    with pytest.raises(ValueError, match="a plot needs 2"):
-        tova.plot_item(sample, "discharge", 0)
+    line = tova.plot_item(sample, "disch", 0).axes[0]  # a 1-D item is a line over x
+    np.testing.assert_array_equal(line.lines[0].get_ydata(), samples.values(0)["discharge"])
+    with pytest.raises(ValueError, match="a picture needs 1 or 2"):
+        tova.plot_item(sample, "flag", 0)

@@ -34,11 +34,19 @@ if "xarray" in sys.modules:  # the accessor needs xarray; importing it here woul
 
 
 def plot_item(path, item, step=-1, **options):
-    """Draws a 2-D item of a gridded data file at one time step with
+    """Draws a 1-D or 2-D item of a gridded data file at one time step with
     matplotlib; see ``tova.plot.plot_item``."""
     from .plot import plot_item as plot
 
     return plot(path, item, step, **options)
+
+
+def plot_static(path, item, **options):
+    """Draws a 1-D or 2-D static item with matplotlib; see
+    ``tova.plot.plot_static``."""
+    from .plot import plot_static as plot
+
+    return plot(path, item, **options)
 
 
 __all__ = [
@@ -61,6 +69,7 @@ __all__ = [
     "library_paths",
     "open",
     "plot_item",
+    "plot_static",
     "to_grd",
     "units",
     "vre",

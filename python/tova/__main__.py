@@ -1,5 +1,6 @@
-"""``python3 -m tova COMMAND ...``: the package's commands. Each command is
-a module with ``main(argv) -> exit status``; ``COMMANDS`` lists them."""
+"""``python3 -m tova COMMAND ...``: the package's commands, which the
+``tova`` tool hands over to Python. Each command is a module with
+``main(argv) -> exit status``; ``COMMANDS`` lists them."""
 
 from __future__ import annotations
 
@@ -9,6 +10,7 @@ import sys
 # name -> (module, one line of help)
 COMMANDS = {
     "convert": ("tova.convert", "convert between netCDF (CF) and gridded data files"),
+    "plot": ("tova.plot", "picture of an item at a time step (PNG)"),
 }
 
 

@@ -35,6 +35,7 @@ from . import _lib, units
 from ._handles import HandlePool, Handles, release
 from ._mask import nan_where_equal
 from .errors import F_ERR_ARGUMENT, F_ERR_SIZE, F_ERR_VALUE, TovaError, UnitError, check, check_open
+from .selection import match_name, step_at
 
 # Element types by simple-type code; byte data are C chars, signed.
 DTYPES = {1: np.dtype(np.float32), 2: np.dtype(np.float64), 3: np.dtype(np.int8), 4: np.dtype(np.int32),
@@ -654,16 +655,16 @@ class GridFile(_OpenFile):
         return self.time_axis.count
 
     def item(self, key) -> Item:
-        """An item by name, by position in ``items`` (0-based) or itself."""
+        """An item by name, by position in ``items`` (0-based) or itself. A
+        name is matched as the tool matches it: exactly, then without regard
+        to case, then as the unique beginning of a name ("water" finds
+        "Water level"); KeyError lists the items otherwise."""
         if isinstance(key, Item) and not isinstance(key, StaticItem):
             if 0 < key.number <= len(self.items) and self.items[key.number - 1] is key:
                 return key
             key = key.name
         if isinstance(key, str):
-            for it in self.items:
-                if it.name == key:
-                    return it
-            raise KeyError(f"{self.path}: no item named {key!r}")
+            return self.items[match_name([it.name for it in self.items], key, "item", self.path)]
         return self.items[_index(key, len(self.items), "item")]
 
     @functools.cached_property
@@ -689,12 +690,11 @@ class GridFile(_OpenFile):
         return out
 
     def static_item(self, key) -> StaticItem:
-        """A static item by name or position (0-based)."""
+        """A static item by name (matched as ``item`` matches) or position
+        (0-based)."""
         if isinstance(key, str):
-            for it in self.static_items:
-                if it.name == key:
-                    return it
-            raise KeyError(f"{self.path}: no static item named {key!r}")
+            names = [it.name for it in self.static_items]
+            return self.static_items[match_name(names, key, "static item", self.path)]
         return self.static_items[_index(key, len(self.static_items), "static item")]
 
     # Time ---------------------------------------------------------------------------
@@ -713,6 +713,14 @@ class GridFile(_OpenFile):
         """The times of a calendar axis as datetime64[ns]; None for other
         axes."""
         return self.time_axis.to_datetime(self.times) if self.time_axis.is_calendar else None
+
+    def find_step(self, when, *, nearest: bool = False) -> int:
+        """The index of the time step at a date and time of a calendar axis
+        (a text such as "2024-03-22T06:00", or a datetime64): exact to a
+        millisecond, or with ``nearest`` the closest step."""
+        if self.datetimes is None:
+            raise ValueError(f"{self.path}: its {self.time_axis.name} time axis has no dates")
+        return step_at(self.datetimes, when, nearest, self.path)
 
     def read_times(self, steps) -> np.ndarray:
         """The stored time of each given step; for file types that store no
@@ -740,6 +748,8 @@ class GridFile(_OpenFile):
         n = self.n_steps
         if steps is None:
             return np.arange(n, dtype=np.int64), False
+        if isinstance(steps, str):  # a date of a calendar axis, as the tool takes it
+            return np.array([self.find_step(steps)], dtype=np.int64), True
         if isinstance(steps, slice):
             return np.arange(n, dtype=np.int64)[steps], False
         if np.ndim(steps) == 0:
@@ -823,11 +833,11 @@ class GridFile(_OpenFile):
         return values
 
     def read(self, item, steps=None, *, mask: bool | None = None) -> np.ndarray:
-        """The values of an item at the given time steps: an integer step
-        gives one array of the item's shape; None (all), a slice or a sequence
-        of steps gives an array with the steps first. Each step is one jump
-        and one read straight into the result; its delete values become NaN
-        while it is fresh in the cache."""
+        """The values of an item at the given time steps: an integer step (or
+        the date of one, "2024-03-22T06:00") gives one array of the item's
+        shape; None (all), a slice or a sequence of steps gives an array with
+        the steps first. Each step is one jump and one read straight into the
+        result; its delete values become NaN while it is fresh in the cache."""
         self._pool.require_open()
         item = self.item(item)
         indices, single = self._steps(steps)

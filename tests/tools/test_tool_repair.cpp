@@ -50,6 +50,8 @@ TEST(ToolRepair, CrashedFileIsRepairable) {
     EXPECT_TRUE(has(run, path + ": header says 2 time steps, file holds 3 complete steps and a partial one")) << run.out;
     EXPECT_TRUE(has(run, "; would repair\n")) << run.out;
     EXPECT_EQ(testutil::readBytes(path), crashed);
+    // info shows the header as it is, with what check says of it.
+    EXPECT_TRUE(has(runTova({"info", path}), "\nwarning: the header says 2 time steps, the data holds 3 complete ones"));
 
     run = runTova({"repair", path});
     EXPECT_EQ(run.exitCode, 0) << run.out;
@@ -94,6 +96,48 @@ TEST(ToolRepair, FileCutInsideCountedStepIsDamagedButKeepsItsWholeSteps) {
     EXPECT_TRUE(has(run, "header says 3 time steps, file holds 2 complete steps and a partial one")) << run.out;
     EXPECT_TRUE(has(runTova({"info", path}), "timeSteps    2\n"));
     EXPECT_EQ(runTova({"check", path}).exitCode, 0);
+}
+
+// check and repair say the same of a file cut anywhere: check names repair
+// exactly when repair then changes the header, and once repair has run, check
+// finds nothing left for it (and repair agrees).
+TEST(ToolRepair, CheckAndRepairAgreeWhereverTheFileIsCut) {
+    testutil::TempDir dir;
+    const std::string whole = dir.file("whole.grd");
+    tooltest::writeGridFile(whole, 4);
+    const std::vector<uint8_t> bytes = testutil::readBytes(whole);
+    const tooltest::Layout layout = tooltest::walkLayout(whole);
+    const std::string path = dir.file("cut.grd");
+    // Cuts every 31 bytes from the header on, and at every record and block
+    // boundary of the time steps (each a 50001 block of 4 bytes, a float
+    // record of 12 and a double record of 5: 102 bytes).
+    std::vector<size_t> cuts;
+    for (size_t cut = layout.appBase + 3; cut < bytes.size(); cut += 31) cuts.push_back(cut);
+    for (const int64_t b : layout.boundaries) {
+        if (b >= static_cast<int64_t>(bytes.size()) - 4 * 102 - 4 && b < static_cast<int64_t>(bytes.size())) {
+            cuts.push_back(static_cast<size_t>(b));
+        }
+    }
+    for (const size_t cut : cuts) {
+        testutil::writeBytes(path, std::vector<uint8_t>(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(cut)));
+        const std::string at = "cut at " + std::to_string(cut);
+        const tooltest::Run check = runTova({"check", path});
+        const bool named = has(check, "tova repair");
+        const tooltest::Run repair = runTova({"repair", path});
+        ASSERT_TRUE(check.clean() && repair.clean()) << at;
+        if (named) {
+            EXPECT_EQ(repair.exitCode, 0) << at << "\n" << check.out << repair.out;
+            EXPECT_TRUE(has(repair, "; repaired\n")) << at << "\n" << check.out << repair.out;
+        } else {
+            EXPECT_FALSE(has(repair, "; repaired\n")) << at << "\n" << check.out << repair.out;
+            EXPECT_EQ(repair.exitCode, check.exitCode) << at << "\n" << check.out << repair.out;
+        }
+        if (repair.exitCode != 0) continue;
+        const tooltest::Run after = runTova({"check", path});
+        EXPECT_EQ(after.exitCode, 0) << at << "\n" << after.out;
+        EXPECT_FALSE(has(after, "tova repair")) << at << "\n" << after.out;
+        EXPECT_TRUE(has(runTova({"repair", path}), "; nothing to repair\n")) << at;
+    }
 }
 
 TEST(ToolRepair, WhatCannotBeRepaired) {

@@ -21,9 +21,10 @@ TEST(ToolUsage, BadCommandLinesExitWithTwoAndSayWhy) {
         {"dump", "f", "--step", "1", "--steps", "1:2"},  // one or the other
         {"dump", "f", "--steps", "5:2"},                 // ends before it begins
         {"dump", "f", "--steps", "x:2"},                 // not a number
-        {"dump", "f", "--item", "0"},                    // items count from 1
+        {"dump", "f", "--time", "2024-13-01"},           // no date
+        {"dump", "f", "--x", "3:1"},                     // ends before it begins
         {"dump", "f", "--static", "1", "--step", "0"},   // static items have no steps
-        {"stats", "f", "--item", "-3"},                  // items count from 1
+        {"stats", "f", "--y", "a"},                      // not an index
     };
     for (const auto& args : bad) {
         const tooltest::Run run = runTova(args);
@@ -33,13 +34,16 @@ TEST(ToolUsage, BadCommandLinesExitWithTwoAndSayWhy) {
         EXPECT_TRUE(run.out.empty()) << line;
     }
     EXPECT_NE(runTova({"frobnicate"}).err.find("frobnicate"), std::string::npos);
+    EXPECT_NE(runTova({"dump", "f", "--limit", "-1"}).err.find("--limit: a number of values, 0 or more: -1"),
+              std::string::npos);
 }
 
 TEST(ToolUsage, HelpAndVersionExitWithZero) {
     const tooltest::Run help = runTova({"--help"});
     EXPECT_EQ(help.exitCode, 0);
-    for (const char* sub : {"info", "dump", "stats", "check", "units", "demo"}) {
-        EXPECT_NE(help.out.find(sub), std::string::npos) << sub;
+    // One line per command.
+    for (const char* sub : {"info", "dump", "stats", "plot", "check", "repair", "units", "demo"}) {
+        EXPECT_NE(help.out.find("\n  " + std::string(sub) + " "), std::string::npos) << sub;
     }
     const tooltest::Run subHelp = runTova({"dump", "--help"});
     EXPECT_EQ(subHelp.exitCode, 0);
@@ -61,7 +65,8 @@ TEST(ToolUsage, GriddedCommandsRefuseWhatTheFileDoesNotHold) {
         {{"stats", dir.file("missing.grd")}, "cannot open"},
         {{"dump", vre}, "no gridded data file"},
         {{"stats", vre, "--item", "1"}, "no gridded data file"},
-        {{"dump", grd, "--item", "3"}, "has no item 3 (items 1 to 2)"},
+        {{"dump", grd, "--item", "3"}, "has no item 3 (items 1 to 2: 1 \"level\", 2 \"flux\")"},
+        {{"dump", grd, "--item", "0"}, "has no item 0 (items 1 to 2"},
         {{"stats", grd, "--item", "9"}, "has no item 9"},
         {{"dump", grd, "--step", "3"}, "holds time steps 0 to 2; time step 3 is not there"},
         {{"dump", grd, "--steps", "1:7"}, "time step 7 is not there"},

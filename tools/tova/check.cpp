@@ -294,30 +294,29 @@ std::unique_ptr<KindCheck> kindCheck(const RecordFileInfo& info) {
     return nullptr;
 }
 
-int damaged(const std::string& path, const Problem& problem) {
-    printOut(path + ": damaged at offset " + std::to_string(problem.offset) + ": " + problem.what + "\n");
-    return kExitFailed;
+std::string damagedLine(const std::string& path, const Problem& problem) {
+    return path + ": damaged at offset " + std::to_string(problem.offset) + ": " + problem.what;
 }
 
 }  // namespace
 
-int runCheck(const CheckOptions& options) {
-    std::error_code ec;
-    if (std::filesystem::exists(options.file, ec) && !std::filesystem::is_directory(options.file, ec) &&
-        !std::filesystem::is_regular_file(options.file, ec)) {
-        throw Failure(options.file + " is not a regular file");
-    }
+Diagnosis diagnose(const std::string& path) {
+    Diagnosis d;
     int32_t status = 0;
-    const RecordFileInfo info = probeRecordFile(options.file, &status);
+    const RecordFileInfo info = probeRecordFile(path, &status);
     if (status != F_NO_ERROR) {
-        // A file that cannot be opened at all is no damaged file: say why.
-        if (status == F_ERR_OPEN || std::filesystem::is_directory(options.file, ec)) probeRecordFile(options.file);
-        return damaged(options.file, diagnoseOpenFailure(options.file, info.size, status));
+        d.damaged = true;
+        d.lines.push_back(damagedLine(path, diagnoseOpenFailure(path, info.size, status)));
+        return d;
     }
-    if (auto problem = checkHeaderBytes(info)) return damaged(options.file, *problem);
+    if (auto problem = checkHeaderBytes(info)) {
+        d.damaged = true;
+        d.lines.push_back(damagedLine(path, *problem));
+        return d;
+    }
 
-    RcfFilePtr file = openRecordFile(options.file, &status);
-    if (status != F_NO_ERROR) throw Failure("cannot open " + options.file + " again: status " + statusText(status));
+    RcfFilePtr file = openRecordFile(path, &status);
+    if (status != F_NO_ERROR) throw Failure("cannot open " + path + " again: status " + statusText(status));
 
     std::unique_ptr<KindCheck> kind = kindCheck(info);
     Counts counts;
@@ -336,18 +335,20 @@ int runCheck(const CheckOptions& options) {
     int32_t inHeader = 0;
     int64_t tail = 0;
     const bool scanned = problem && info.kind == FileKind::Grid &&
-                         grdFileScan(options.file.c_str(), &found, &inHeader, &tail) == F_NO_ERROR;
+                         grdFileScan(path.c_str(), &found, &inHeader, &tail) == F_NO_ERROR;
     // Only a step the header does not count yet: a header that counts it
     // describes data that are missing.
     if (scanned && problem->fileEnds && tail > 0 && found >= inHeader && static_cast<uint64_t>(tail) < info.size &&
         problem->offset >= static_cast<int64_t>(info.size) - tail) {
         walked.size -= static_cast<uint64_t>(tail);
+        // Repair leaves the unfinished step where it is: it is no reason to
+        // run it (a header behind its data is, and says so itself).
         tailWarning = "an unfinished time step (" + std::to_string(tail) + " bytes) follows the " +
                       std::to_string(found) +
                       " complete ones, as a writer leaves it that was killed: readers ignore it, the next "
-                      "append replaces it (repairable: run `tova repair " + options.file + "`)";
-        file = openRecordFile(options.file, &status);
-        if (status != F_NO_ERROR) throw Failure("cannot open " + options.file + " again: status " + statusText(status));
+                      "append replaces it";
+        file = openRecordFile(path, &status);
+        if (status != F_NO_ERROR) throw Failure("cannot open " + path + " again: status " + statusText(status));
         kind = kindCheck(walked);
         counts = Counts{};
         problem = walk(file.get(), walked, kind.get(), counts);
@@ -355,27 +356,67 @@ int runCheck(const CheckOptions& options) {
         if (!problem && kind != nullptr) problem = kind->finish();
     }
     if (problem) {
-        const int result = damaged(options.file, *problem);
+        d.damaged = true;
+        d.lines.push_back(damagedLine(path, *problem));
         // Data lost at the end of a gridded file (a copy cut short, a disk
-        // that filled up): what is whole before it can still be kept.
-        if (scanned && found < inHeader) {
-            printOut("note: the header counts " + std::to_string(inHeader) + " time steps, " + std::to_string(found) +
-                     " are whole: `tova repair " + options.file + "` keeps those and makes the header count them\n");
+        // that filled up): what is whole before it can still be kept. Damage
+        // before the time steps stays whatever the header counts.
+        if (scanned && found < inHeader && kind != nullptr && kind->beforeStepsWhole()) {
+            d.repairable = true;
+            d.lines.push_back("note: the header counts " + std::to_string(inHeader) + " time steps, " +
+                              std::to_string(found) + " are whole: `tova repair " + path +
+                              "` keeps those and makes the header count them");
         }
-        return result;
+        return d;
     }
 
-    std::string report;
-    if (kind == nullptr) report += "note: unknown application: only the record structure was checked\n";
-    if (!tailWarning.empty()) report += "warning: " + tailWarning + "\n";
+    if (kind == nullptr) d.lines.emplace_back("note: unknown application: only the record structure was checked");
+    if (!tailWarning.empty()) d.lines.push_back("warning: " + tailWarning);
     if (kind != nullptr) {
-        for (const std::string& warning : kind->warnings()) report += "warning: " + warning + "\n";
-        for (const std::string& note : kind->notes()) report += "note: " + note + "\n";
+        for (const std::string& warning : kind->warnings()) d.lines.push_back("warning: " + warning);
+        for (const std::string& note : kind->notes()) d.lines.push_back("note: " + note);
+        d.repairable = kind->repairable();
     }
-    report += "OK: " + std::to_string(counts.records) + " records in " + std::to_string(counts.blocks) + " blocks, " +
-              std::to_string(walked.size) + " bytes\n";
+    d.lines.push_back("OK: " + std::to_string(counts.records) + " records in " + std::to_string(counts.blocks) +
+                      " blocks, " + std::to_string(walked.size) + " bytes");
+    return d;
+}
+
+int runCheck(const CheckOptions& options) {
+    std::error_code ec;
+    if (std::filesystem::exists(options.file, ec) && !std::filesystem::is_directory(options.file, ec) &&
+        !std::filesystem::is_regular_file(options.file, ec)) {
+        throw Failure(options.file + " is not a regular file");
+    }
+    int32_t status = 0;
+    probeRecordFile(options.file, &status);
+    // A file that cannot be opened at all is no damaged file: say why.
+    if (status == F_ERR_OPEN || std::filesystem::is_directory(options.file, ec)) probeRecordFile(options.file);
+    const Diagnosis d = diagnose(options.file);
+    std::string report;
+    for (const std::string& line : d.lines) report += line + "\n";
     printOut(report);
-    return kExitOk;
+    return d.damaged ? kExitFailed : kExitOk;
+}
+
+int reportDamage(const std::string& path, const std::string& failure) {
+    Diagnosis d;
+    try {
+        d = diagnose(path);
+    } catch (const Failure&) {  // cannot be opened at all: the failure says it
+    }
+    std::string text;
+    if (d.damaged) {
+        for (const std::string& line : d.lines) text += (text.empty() ? "tova: " : "") + line + "\n";
+    } else {
+        // Not damaged as `check` sees it: the failure stands, with any warning.
+        text = "tova: " + failure + "\n";
+        for (const std::string& line : d.lines) {
+            if (line.rfind("warning: ", 0) == 0) text += line + "\n";
+        }
+    }
+    std::fputs(text.c_str(), stderr);
+    return kExitFailed;
 }
 
 }  // namespace tova_cli

@@ -44,11 +44,28 @@ public:
     const std::vector<std::string>& notes() const { return notes_; }
     // Findings that are no damage but need the user's attention.
     const std::vector<std::string>& warnings() const { return warnings_; }
+    // Whether `tova repair` would bring the file up to date.
+    bool repairable() const { return repairable_; }
+    // Whether everything before the time steps was whole where the walk
+    // stopped: damage after that point loses time steps only.
+    virtual bool beforeStepsWhole() const { return false; }
 
 protected:
+    bool repairable_ = false;
     std::vector<std::string> notes_;
     std::vector<std::string> warnings_;
 };
+
+// What `check` says of a file: "FILE: damaged at offset N: ..." and the notes
+// on it, or the warnings, notes and the "OK: ..." line of a sound file.
+struct Diagnosis {
+    bool damaged = false;
+    bool repairable = false;  // `tova repair` would change the file's header
+    std::vector<std::string> lines;
+};
+// The full check of a record file (walks every record, with progress on a
+// terminal). Failure only when the file cannot be opened at all.
+Diagnosis diagnose(const std::string& path);
 
 std::unique_ptr<KindCheck> vreCheck(const RecordFileInfo& file);
 std::unique_ptr<KindCheck> xsecCheck(const RecordFileInfo& file);

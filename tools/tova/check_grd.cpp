@@ -136,7 +136,7 @@ public:
                                     std::to_string(statics_.size())};
         }
         if (section_ == Section::Dynamic) {
-            if (strictSteps_ && next_ != 0) {
+            if (stepOpen_) {
                 return Problem{end,
                                "time step " + std::to_string(stepsSeen_ - 1) + " ends after " + std::to_string(next_) +
                                    " of its " + std::to_string(items_.size()) + " item records: the file is cut short",
@@ -151,6 +151,7 @@ public:
                                     " time steps, the file ends before its dynamic section (block 50000)"};
         }
         if (stepsSeen_ > headerSteps_) {
+            repairable_ = true;
             warnings_.push_back("the header says " + std::to_string(headerSteps_) + " time steps, the data holds " +
                              std::to_string(stepsSeen_) +
                              " complete ones: the header was not brought up to date after the last steps were "
@@ -162,6 +163,10 @@ public:
                              ": the records of each time step were checked for their number only");
         }
         return loadThroughApi();
+    }
+
+    bool beforeStepsWhole() const override {
+        return section_ == Section::Dynamic || (section_ == Section::Static && !pendingStatic_);
     }
 
 private:
@@ -266,13 +271,15 @@ private:
             strictSteps_ = fileType_ == F_EQTIME_FIXEDSPACE_ALLITEMS || fileType_ == F_NEQTIME_FIXEDSPACE_ALLITEMS;
         } else if (tag == kTimeStep) {
             if (section_ != Section::Dynamic) return misplaced("a time step");
-            if (next_ != 0) {
+            if (stepOpen_) {
                 return at(m, "time step " + std::to_string(stepsSeen_) + " begins after only " + std::to_string(next_) +
                                  " of the " + std::to_string(items_.size()) + " item records of time step " +
                                  std::to_string(stepsSeen_ - 1));
             }
             stepOffsets_.push_back(m.offset);
             ++stepsSeen_;
+            // Whole once its last item record follows (a 50001 block alone is no step).
+            stepOpen_ = strictSteps_ && !items_.empty();
         } else {
             return at(m, "block " + std::to_string(tag) + " is no block of gridded data files");
         }
@@ -537,7 +544,10 @@ private:
                              ": expected " + withArticle(recordText(item.dataType, static_cast<uint32_t>(used))) +
                              ", found " + withArticle(recordText(m.type, m.count)));
         }
-        if (++next_ == items_.size()) next_ = 0;
+        if (++next_ == items_.size()) {
+            next_ = 0;
+            stepOpen_ = false;
+        }
         return std::nullopt;
     }
 
@@ -623,6 +633,7 @@ private:
     std::vector<int64_t> stepOffsets_;  // of each 50001 block
     int64_t stepsSeen_ = 0;
     size_t next_ = 0;           // item record due next in the time step
+    bool stepOpen_ = false;     // the last time step still lacks item records
     bool strictSteps_ = false;  // the file type fixes the records of a time step
 };
 

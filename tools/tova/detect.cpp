@@ -10,6 +10,7 @@
 
 #include "handles.h"
 #include "tova/rcf.h"
+#include "tova/status.h"
 #include "tova_cli.h"
 
 namespace tova_cli {
@@ -40,37 +41,11 @@ const char* kindId(FileKind kind) {
 }
 
 std::string statusText(int32_t code) {
-    const char* meaning = nullptr;
-    switch (code) {
-    case F_NO_ERROR: meaning = "no error"; break;
-    case F_EOF: meaning = "end of file met"; break;
-    case F_ERR_ARGUMENT: meaning = "bad argument"; break;
-    case F_ERR_TIMESTEP_RANGE: meaning = "time step out of range"; break;
-    case F_ERR_ITEM_RANGE: meaning = "no such item"; break;
-    case F_ERR_MEMORY: meaning = "out of memory"; break;
-    case F_ERR_READ: meaning = "read failed"; break;
-    case F_ERR_WRITE: meaning = "write failed"; break;
-    case F_ERR_OPEN: meaning = "cannot open the file"; break;
-    case F_ERR_CLOSE: meaning = "close failed"; break;
-    case F_ERR_FLUSH: meaning = "flush failed"; break;
-    case F_ERR_SEEK: meaning = "positioning failed"; break;
-    case F_ERR_ITEMNO: meaning = "item number out of range"; break;
-    case F_ERR_ELEMENT: meaning = "element index out of range"; break;
-    case F_ERR_TYPE: meaning = "record of the wrong type"; break;
-    case F_ERR_VALUE: meaning = "value not valid"; break;
-    case F_ERR_DATE_FORMAT: meaning = "bad date text"; break;
-    case F_ERR_TIME_FORMAT: meaning = "bad time text"; break;
-    case F_ERR_SIZE: meaning = "record of the wrong size"; break;
-    case F_ERR_NOT_RCF: meaning = "not a record file"; break;
-    case F_ERR_READONLY: meaning = "file is read-only"; break;
-    case F_ERR_NOT_BLOCK: meaning = "no block where one was expected"; break;
-    case F_ERR_APP_TAG: meaning = "application tag does not match"; break;
-    case F_ERR_DATA_TYPE: meaning = "data type not allowed here"; break;
-    case F_ERR_SKIP: meaning = "block mark where a record was expected"; break;
-    case F_ERR_UNIT: meaning = "unit not valid for the quantity"; break;
-    default: break;
-    }
-    return meaning != nullptr ? std::to_string(code) + " (" + meaning + ")" : std::to_string(code);
+    // The library's text is "NAME: meaning"; the meaning is enough here.
+    const std::string text = grdGetStatusText(code);
+    const size_t colon = text.find(": ");
+    if (colon == std::string::npos) return std::to_string(code);
+    return std::to_string(code) + " (" + text.substr(colon + 2) + ")";
 }
 
 RecordFileInfo probeRecordFile(const std::string& path, int32_t* status) {

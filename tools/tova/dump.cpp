@@ -1,9 +1,10 @@
-// `tova dump FILE [--item N] [--step T | --steps A:B] [--static N]
-// [--format text|csv] [--limit N]`: the values of a gridded data file, one
-// line per element with its grid indices. Time steps are found with the
-// library's positioning (a jump, no reading of earlier steps); a single item
-// is reached by skipping the items before it. Delete values are shown as
-// "delete" in text and as an empty field in CSV.
+// `tova dump FILE [--item ITEM]... [--time WHEN [--nearest]] [--x A:B] [--y
+// A:B] [--z A:B] [--static ITEM] [--format text|csv] [--limit N]`: the values
+// of a gridded data file, one line per element with its grid indices. Time
+// steps are found with the library's positioning (a jump, no reading of
+// earlier steps); an item is reached by skipping the items before it.
+// Delete values are shown as "delete" in text and as an empty field in CSV.
+// A file that turns out damaged on the way ends with what `check` says.
 #include <algorithm>
 #include <charconv>
 #include <cstdio>
@@ -12,6 +13,8 @@
 
 #include "grd_access.h"
 #include "grd_commands.h"
+#include "progress.h"
+#include "selection.h"
 #include "tova_cli.h"
 
 namespace tova_cli {
@@ -66,9 +69,10 @@ public:
           deleteDouble_(grdGetDeleteValDouble(h)), deleteByte_(static_cast<signed char>(grdGetDeleteValByte(h))),
           deleteInt_(grdGetDeleteValInt(h)), deleteUnsigned_(grdGetDeleteValUnsignedInt(h)) {}
 
-    // Writes the values; prefix starts each CSV line.
-    void write(Out& out, const Layout& l, const unsigned char* data, const std::string& prefix) {
-        const int64_t shown = limit_ ? std::min(*limit_, l.elements) : l.elements;
+    // Writes the values of the cells in box; prefix starts each CSV line.
+    void write(Out& out, const Layout& l, const Box& box, const unsigned char* data, const std::string& prefix) {
+        const int64_t total = box.count();
+        const int64_t shown = limit_ ? std::min(*limit_, total) : total;
         std::string& s = out.text();
         if (format_ == DumpFormat::Text) {
             static const char* const kIndex[] = {"i", "j", "k", "l"};
@@ -76,35 +80,41 @@ public:
             for (int32_t d = 0; d < std::min(l.dims, 3); ++d) s += std::string(8 - std::strlen(kIndex[d]), ' ') + kIndex[d];
             s += "  value\n";
         }
-        for (int64_t e = 0; e < shown; ++e) {
-            const int64_t idx[3] = {e % l.nx, (e / l.nx) % l.ny, e / (l.nx * l.ny)};
-            if (format_ == DumpFormat::Text) {
-                s += "  ";
-                for (int32_t d = 0; d < std::min(l.dims, 3); ++d) {
-                    char cell[24];
-                    std::snprintf(cell, sizeof(cell), "%8lld", static_cast<long long>(idx[d]));
-                    s += cell;
-                }
-                s += "  ";
-            } else {
-                s += prefix;
-                appendNumber(s, e);
-                for (int32_t d = 0; d < 3; ++d) {
-                    s += ',';
-                    if (d < l.dims) appendNumber(s, idx[d]);
-                }
-                s += ',';
-            }
-            value(s, l.type, data, e);
-            s += '\n';
-            out.maybeFlush();
-        }
-        if (format_ == DumpFormat::Text && shown < l.elements) {
-            s += "  ... " + std::to_string(l.elements - shown) + " more values\n";
+        int64_t written = 0;
+        box.forEachRun([&](int64_t first, int64_t length) {
+            for (int64_t e = first; e < first + length && written < shown; ++e, ++written) line(out, l, data, e, prefix);
+        });
+        if (format_ == DumpFormat::Text && shown < total) {
+            s += "  ... " + std::to_string(total - shown) + " more values\n";
         }
     }
 
 private:
+    void line(Out& out, const Layout& l, const unsigned char* data, int64_t e, const std::string& prefix) {
+        std::string& s = out.text();
+        const int64_t idx[3] = {e % l.nx, (e / l.nx) % l.ny, e / (l.nx * l.ny)};
+        if (format_ == DumpFormat::Text) {
+            s += "  ";
+            for (int32_t d = 0; d < std::min(l.dims, 3); ++d) {
+                char cell[24];
+                std::snprintf(cell, sizeof(cell), "%8lld", static_cast<long long>(idx[d]));
+                s += cell;
+            }
+            s += "  ";
+        } else {
+            s += prefix;
+            appendNumber(s, e);
+            for (int32_t d = 0; d < 3; ++d) {
+                s += ',';
+                if (d < l.dims) appendNumber(s, idx[d]);
+            }
+            s += ',';
+        }
+        value(s, l.type, data, e);
+        s += '\n';
+        out.maybeFlush();
+    }
+
     void deleted(std::string& s) const {
         if (format_ == DumpFormat::Text) s += "delete";
     }
@@ -184,11 +194,29 @@ void check(int32_t status, const std::string& what) {
     throw Failure(what + ": status " + statusText(status));
 }
 
+std::string itemLabel(const char* what, int32_t n, const std::string& name) {
+    return std::string(what) + " " + std::to_string(n) + " \"" + name + "\"";
+}
+
+// The names of the static items after the encoding keys; the file is left
+// positioned at the first of them.
+std::vector<std::string> staticNames(const GridFile& grid, const std::string& path) {
+    std::vector<std::string> names;
+    check(grdFindBlockStatic(grid.header(), grid.file()), path + ": cannot find the static items");
+    for (;;) {
+        int32_t status = 0;
+        const StaticPtr item = readStatic(grid.file(), &status);
+        if (!item) {
+            check(status, path + ": static item " + std::to_string(names.size() + 1));
+            return names;
+        }
+        names.push_back(itemInfo(item.get()).name);
+    }
+}
+
 int dumpStatic(const GridFile& grid, const DumpOptions& options, uint64_t fileSize) {
-    const int32_t n = *options.staticItem;
-    const int32_t found = grdFindItemStatic(grid.header(), grid.file(), n);
-    if (found == F_ERR_ITEM_RANGE) throw Failure(options.file + " has no static item " + std::to_string(n));
-    check(found, options.file + ": cannot find static item " + std::to_string(n));
+    const int32_t n = findByName(staticNames(grid, options.file), *options.staticItem, "static item", options.file);
+    check(grdFindItemStatic(grid.header(), grid.file(), n), options.file + ": cannot find static item " + std::to_string(n));
     int32_t status = 0;
     const StaticPtr item = readStatic(grid.file(), &status);
     if (!item) {
@@ -197,6 +225,7 @@ int dumpStatic(const GridFile& grid, const DumpOptions& options, uint64_t fileSi
     }
     const std::string what = options.file + ": static item " + std::to_string(n);
     const Layout l = layoutOf(item.get(), fileSize, what);
+    const Box box(itemGeometry(item.get()), options.select.axes, itemLabel("static item", n, itemInfo(item.get()).name));
     std::vector<unsigned char> values(std::max<size_t>(l.bytes, 8));
     check(grdStaticGetData(item.get(), values.data()), what);
 
@@ -207,70 +236,80 @@ int dumpStatic(const GridFile& grid, const DumpOptions& options, uint64_t fileSi
     } else {
         out.text() += "static " + headerLine(itemInfo(item.get()), n, l, itemGeometry(item.get())).substr(5) + "\n";
     }
-    writer.write(out, l, values.data(), std::to_string(n) + ",");
+    writer.write(out, l, box, values.data(), std::to_string(n) + ",");
     return kExitOk;
 }
+
+// One selected item: how its values lie, which cells are shown, its title.
+struct Shown {
+    int32_t number = 0;
+    Layout layout;
+    Box box;
+    std::string title;
+};
 
 }  // namespace
 
 int runDump(const DumpOptions& options) {
     const RecordFileInfo file = probeGridFile(options.file);
-    const GridFile grid(options.file);
-    if (options.staticItem) return dumpStatic(grid, options, file.size);
+    int32_t opened = 0;
+    const GridFile grid(options.file, &opened);
+    if (opened != F_NO_ERROR) {
+        return reportDamage(options.file, options.file + ": the gridded data-file reader refuses the file: status " +
+                                              statusText(opened));
+    }
+    if (options.staticItem) {
+        try {
+            return dumpStatic(grid, options, file.size);
+        } catch (const Failure& e) {
+            return reportDamage(options.file, e.what());
+        }
+    }
 
     const HeaderHandle h = grid.header();
     const FileHandle f = grid.file();
-    checkItemNumber(h, options.item, options.file);
-    const int32_t items = grdGetNoOfItems(h);
     const TimeAxis axis = timeAxis(h);
-    const int64_t steps = axis.timeSteps;
-    const StepRange range = options.steps.value_or(StepRange{});
-    if (steps == 0) throw Failure(options.file + " holds no time steps");
-    const int64_t last = range.last.value_or(steps - 1);
-    if (range.first >= steps || last >= steps) {
-        throw Failure(options.file + " holds time steps 0 to " + std::to_string(steps - 1) + "; time step " +
-                      std::to_string(range.first >= steps ? range.first : last) + " is not there");
-    }
-
-    const int32_t firstItem = options.item.value_or(1);
-    const int32_t lastItem = options.item.value_or(items);
-    std::vector<Layout> layouts(static_cast<size_t>(items) + 1);
-    std::vector<std::string> titles(static_cast<size_t>(items) + 1);
+    const StepSpan steps = selectSteps(grid, axis, options.select.time, options.select.nearest, options.file);
+    if (steps.count() == 0) throw Failure(options.file + " holds no time steps");
+    std::vector<Shown> shown;
     size_t largest = 8;
-    for (int32_t n = firstItem; n <= lastItem; ++n) {
+    for (const int32_t n : selectItems(h, options.select.items, options.file)) {
         const ItemHandle item = grdItemD(h, n);
-        const std::string what = options.file + ": item " + std::to_string(n);
-        layouts[static_cast<size_t>(n)] = layoutOf(item, file.size, what);
-        titles[static_cast<size_t>(n)] = headerLine(itemInfo(item), n, layouts[static_cast<size_t>(n)], itemGeometry(item));
-        largest = std::max(largest, layouts[static_cast<size_t>(n)].bytes);
+        const ItemInfo info = itemInfo(item);
+        const Geometry g = itemGeometry(item);
+        const Layout l = layoutOf(item, file.size, options.file + ": item " + std::to_string(n));
+        shown.push_back(Shown{n, l, Box(g, options.select.axes, itemLabel("item", n, info.name)), headerLine(info, n, l, g)});
+        largest = std::max(largest, l.bytes);
     }
     std::vector<unsigned char> values(largest);
 
     Out out;
     ValueWriter writer(h, options.format, options.limit);
+    Progress progress("dumping", file.size, 64ull << 20, true);
     if (options.format == DumpFormat::Csv) out.text() += "step,time,item,element,i,j,k,value\n";
-    for (int64_t t = range.first; t <= last; ++t) {
-        const auto step = static_cast<int32_t>(t);
-        const std::string where = options.file + ": time step " + std::to_string(t);
-        // With all items the cursor stands at the next step already; a single
-        // item is reached by skipping the items before it.
-        if (options.item) {
-            check(grdFindItemDynamic(h, f, step, firstItem), where + ", item " + std::to_string(firstItem));
-        } else {
-            check(grdFindTimeStep(h, f, step), where);
-        }
-        for (int32_t n = firstItem; n <= lastItem; ++n) {
-            double time = 0;
-            check(grdReadItemTimeStep(h, f, &time, values.data()), where + ", item " + std::to_string(n));
-            const double rel = axis.equidistant ? axis.stepOffset(t) : time;
-            if (options.format == DumpFormat::Text) {
-                if (t != range.first || n != firstItem) out.text() += '\n';
-                out.text() += "time step " + std::to_string(t) + "  " + axis.text(rel) + "  " +
-                              titles[static_cast<size_t>(n)] + "\n";
+    try {
+        for (int64_t t = steps.first; t <= steps.last; ++t) {
+            const auto step = static_cast<int32_t>(t);
+            const std::string where = options.file + ": time step " + std::to_string(t);
+            for (const Shown& item : shown) {
+                const std::string what = where + ", item " + std::to_string(item.number);
+                // The cursor stands at the next item already when items follow in file order.
+                check(grdFindItemDynamic(h, f, step, item.number), what);
+                double time = 0;
+                check(grdReadItemTimeStep(h, f, &time, values.data()), what);
+                progress.update(static_cast<uint64_t>(std::max<int64_t>(rcfTell64(f), 0)));
+                const double rel = axis.equidistant ? axis.stepOffset(t) : time;
+                if (options.format == DumpFormat::Text) {
+                    if (t != steps.first || &item != &shown.front()) out.text() += '\n';
+                    out.text() += "time step " + std::to_string(t) + "  " + axis.text(rel) + "  " + item.title + "\n";
+                }
+                const std::string prefix = std::to_string(t) + "," + axis.value(rel) + "," + std::to_string(item.number) + ",";
+                writer.write(out, item.layout, item.box, values.data(), prefix);
             }
-            const std::string prefix = std::to_string(t) + "," + axis.value(rel) + "," + std::to_string(n) + ",";
-            writer.write(out, layouts[static_cast<size_t>(n)], values.data(), prefix);
         }
+    } catch (const Failure& e) {
+        out.flush();
+        return reportDamage(options.file, e.what());
     }
     return kExitOk;
 }

@@ -50,13 +50,6 @@ RecordFileInfo probeGridFile(const std::string& path) {
     return file;
 }
 
-void checkItemNumber(HeaderHandle header, std::optional<int32_t> item, const std::string& path) {
-    const int32_t items = grdGetNoOfItems(header);
-    if (item && (*item < 1 || *item > items)) {
-        throw Failure(path + " has no item " + std::to_string(*item) + " (items 1 to " + std::to_string(items) + ")");
-    }
-}
-
 size_t valueBytes(int64_t elements, int32_t type, uint64_t fileSize, const std::string& what) {
     const size_t size = elementSize(type);
     if (size == 0) throw Failure(what + " has data type " + std::to_string(type) + ", no simple type");
@@ -70,6 +63,27 @@ size_t valueBytes(int64_t elements, int32_t type, uint64_t fileSize, const std::
 StaticPtr readStatic(FileHandle file, int32_t* status) {
     *status = F_NO_ERROR;
     return StaticPtr(grdStaticRead(file, status));
+}
+
+double storedMean(HeaderHandle header, int32_t n) {
+    const int32_t type = grdGetItemStatsType(header);
+    if (type != F_ITEM_STATS_ELEMENT && type != F_ITEM_STATS_ELEMENT_ALT) return std::nan("");
+    double sum = 0;
+    int64_t count = 0;
+    const int32_t used = grdGetUsedItemElements(grdItemD(header, n));
+    for (int32_t e = 0; e < used; ++e) {
+        double mean = 0;
+        int32_t values = 0;
+        if (grdGetItemStats(header, n, e, nullptr, nullptr, &mean, nullptr, nullptr, &values, nullptr, nullptr) !=
+            F_NO_ERROR) {
+            return std::nan("");
+        }
+        if (values > 0) {
+            sum += mean * values;
+            count += values;
+        }
+    }
+    return count > 0 ? sum / static_cast<double>(count) : std::nan("");
 }
 
 ItemInfo itemInfo(ItemHandle item) {
@@ -175,8 +189,6 @@ Value floatValue(float f) {
     return std::strtod(formatFloat(f).c_str(), nullptr);
 }
 
-namespace {
-
 // Days since 1970-01-01 of a date of the proleptic Gregorian calendar.
 int64_t daysFromCivil(int64_t y, int64_t m, int64_t d) {
     y -= m <= 2 ? 1 : 0;
@@ -186,6 +198,8 @@ int64_t daysFromCivil(int64_t y, int64_t m, int64_t d) {
     const int64_t doe = yoe * 365 + yoe / 4 - yoe / 100 + doy;
     return era * 146097 + doe - 719468;
 }
+
+namespace {
 
 void civilFromDays(int64_t z, int64_t* y, int64_t* m, int64_t* d) {
     z += 719468;

@@ -46,8 +46,6 @@ using StaticPtr = std::unique_ptr<std::remove_pointer_t<ItemHandle>, StaticFree>
 
 // The record-file header of path; Failure unless it is a gridded data file.
 RecordFileInfo probeGridFile(const std::string& path);
-// Failure when item is given and is none of the header's items.
-void checkItemNumber(HeaderHandle header, std::optional<int32_t> item, const std::string& path);
 // Bytes of the value array of an item (elements of a simple type); Failure
 // with what as the subject when no file of fileSize bytes could fill it (a
 // compressed item is read into its whole grid, so up to 64 times the file).
@@ -56,6 +54,10 @@ size_t valueBytes(int64_t elements, int32_t type, uint64_t fileSize, const std::
 // The next static item of the file, or null at the end of the static section
 // (*status 0) or on failure.
 StaticPtr readStatic(FileHandle file, int32_t* status);
+
+// The mean over all values of dynamic item n from the per-element means and
+// counts the file keeps (statistics types 2 and 3); NaN without them.
+double storedMean(HeaderHandle header, int32_t n);
 
 // Name, quantity and unit of an item as the unit library names them.
 struct ItemInfo {
@@ -129,6 +131,9 @@ struct TimeAxis {
 // The header's time axis (type 0 when it has none). The calendar getters run
 // with the modify-times flag set, so that dates already include the offset.
 TimeAxis timeAxis(HeaderHandle header);
+
+// Days since 1970-01-01 of a date of the proleptic Gregorian calendar.
+int64_t daysFromCivil(int64_t y, int64_t m, int64_t d);
 
 // The date and time of a calendar start advanced by seconds:
 // "yyyy-mm-dd hh:mm:ss", with a fraction of a second when there is one.

@@ -7,36 +7,40 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "check.h"
+#include "selection.h"
 #include "tova_cli.h"
 
 namespace tova_cli {
-
-// Time steps first..last, 0-based and inclusive; no last: to the end.
-struct StepRange {
-    int64_t first = 0;
-    std::optional<int64_t> last;
-};
 
 enum class DumpFormat { Text, Csv };
 
 struct DumpOptions {
     std::string file;
-    std::optional<int32_t> item;        // 1-based item number; all items when absent
-    std::optional<StepRange> steps;     // all time steps when absent
-    std::optional<int32_t> staticItem;  // 1-based static item: dump it instead of time steps
-    std::optional<int64_t> limit;       // values shown per item and time step
+    Selection select;
+    std::optional<std::string> staticItem;  // number or name: dump it instead of time steps
+    std::optional<int64_t> limit;           // values shown per item and time step
     DumpFormat format = DumpFormat::Text;
 };
 int runDump(const DumpOptions& options);
 
 struct StatsOptions {
     std::string file;
-    std::optional<int32_t> item;  // 1-based; all items when absent
+    Selection select;
     bool json = false;
 };
 int runStats(const StatsOptions& options);
+
+// `plot`: drawn by the Python package (python3 -m tova plot); args are the
+// command line after "plot".
+int runPlot(const std::vector<std::string>& args);
+
+// Says what `check` says of a damaged file on standard error, in place of
+// failure (which is said when the check finds nothing wrong); returns
+// kExitFailed.
+int reportDamage(const std::string& path, const std::string& failure);
 
 struct DemoOptions {
     std::string out = "sample.grd";
@@ -46,7 +50,12 @@ int runDemo(const DemoOptions& options);
 // The gridded-data part of `info` (added under "grd"): file type, titles,
 // application, data type, delete values, projection, time axis, items, static
 // items, custom blocks.
-Value describeGrid(const RecordFileInfo& file);
+// *diagnosis gets what `check` says when the data end elsewhere than the
+// header's time steps do (it stays empty for a sound file).
+Value describeGrid(const RecordFileInfo& file, Diagnosis* diagnosis);
+// One item in full for `info --item`: quantity, unit, axis with its
+// coordinates, the time steps and the statistics the file keeps.
+Value describeItem(const RecordFileInfo& file, const std::string& key);
 
 // `repair`: the header of a file whose writer was killed brought up to date
 // with the complete time steps on disk.

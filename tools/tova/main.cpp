@@ -20,34 +20,56 @@ namespace {
 
 using namespace tova_cli;
 
-// "A:B", "A:", ":B" or "A" with 0 <= A <= B.
-StepRange parseSteps(const std::string& text) {
-    const auto number = [&](const std::string& part) -> int64_t {
-        size_t used = 0;
-        int64_t value = -1;
-        try {
-            value = std::stoll(part, &used);
-        } catch (const std::exception&) {
-            used = 0;
-        }
-        if (used != part.size() || value < 0) throw CLI::ValidationError("--steps", "not a time-step range: " + text);
-        return value;
-    };
-    StepRange range;
-    const size_t colon = text.find(':');
-    if (colon == std::string::npos) {
-        range.first = number(text);
-        range.last = range.first;
-        return range;
+std::string rangeSyntax(const std::string& text) {
+    const auto range = parseRange(text);
+    if (!range) return "not an index or a range A:B: " + text;
+    if (range->first && range->last && *range->first >= 0 && *range->last >= 0 && *range->last < *range->first) {
+        return "the range " + text + " ends before it begins";
     }
-    const std::string first = text.substr(0, colon);
-    const std::string last = text.substr(colon + 1);
-    if (!first.empty()) range.first = number(first);
-    if (!last.empty()) range.last = number(last);
-    if (range.last && *range.last < range.first) {
-        throw CLI::ValidationError("--steps", "the range " + text + " ends before it begins");
+    return {};
+}
+
+// The forms --time takes: a time step, a range, a date or two joined by "/".
+std::string timeSyntax(const std::string& text) {
+    if (parseRange(text)) return rangeSyntax(text);
+    const size_t slash = text.find('/');
+    const auto dateOrEmpty = [](const std::string& part) { return part.empty() || parseDateTime(part).has_value(); };
+    if (slash != std::string::npos && text != "/" && dateOrEmpty(text.substr(0, slash)) &&
+        dateOrEmpty(text.substr(slash + 1))) {
+        return {};
     }
-    return range;
+    if (slash == std::string::npos && parseDateTime(text)) return {};
+    return "not a time step, a range A:B or a date (2024-03-22T06:00, or two joined by /): " + text;
+}
+
+// A count of 0 or more (CLI11's own range check would name the largest double).
+std::string countSyntax(const std::string& text) {
+    const auto range = parseRange(text);
+    if (!range || !range->first || range->first != range->last || *range->first < 0) {
+        return "a number of values, 0 or more: " + text;
+    }
+    return {};
+}
+
+// The selection options of dump and stats.
+void addSelection(CLI::App* cmd, Selection& select) {
+    cmd->add_option("--item", select.items,
+                    "items by number or name (exact, else a unique beginning, any case); repeat it or list them "
+                    "with commas")
+        ->type_name("ITEM");
+    cmd->add_option("--time,--step,--steps", select.time,
+                    "time steps: T, A:B (inclusive; negative from the end), a date 2024-03-22T06:00 or a date "
+                    "range FROM/TO")
+        ->type_name("WHEN")
+        ->check(CLI::Validator(timeSyntax, "WHEN"));
+    cmd->add_flag("--nearest", select.nearest, "a date takes the nearest time step instead of an exact one");
+    static const char* const kAxes[] = {"--x", "--y", "--z"};
+    for (size_t d = 0; d < 3; ++d) {
+        cmd->add_option(kAxes[d], select.axes[d], std::string("grid indices in the ") + (kAxes[d] + 2) +
+                                                      " direction: I or A:B (0-based, inclusive)")
+            ->type_name("A:B")
+            ->check(CLI::Validator(rangeSyntax, "A:B"));
+    }
 }
 
 std::string versionText() {
@@ -68,37 +90,27 @@ int run(int argc, char** argv) {
     infoCmd->add_option("FILE", info.file, "the file to describe")->required();
     infoCmd->add_flag("--json", info.json, "print JSON instead of text");
 
+    infoCmd->add_option("--item", info.item, "one item in full (axis coordinates, statistics), by number or name");
+
     DumpOptions dump;
-    int32_t dumpItem = 0;
-    int64_t dumpStep = 0;
-    std::string dumpSteps;
-    int32_t dumpStatic = 0;
     std::string dumpFormat = "text";
-    CLI::App* dumpCmd = app.add_subcommand("dump", "Values of a gridded data file");
+    CLI::App* dumpCmd = app.add_subcommand("dump", "Values of a gridded data file, by item, time step and cell");
     dumpCmd->add_option("FILE", dump.file, "the gridded data file")->required();
-    CLI::Option* itemOpt = dumpCmd->add_option("--item", dumpItem, "only item N (1-based)")->check(CLI::PositiveNumber);
-    CLI::Option* stepOpt =
-        dumpCmd->add_option("--step", dumpStep, "only time step T (0-based)")->check(CLI::NonNegativeNumber);
-    CLI::Option* stepsOpt = dumpCmd->add_option("--steps", dumpSteps, "time steps A to B (0-based, inclusive)")
-                                ->type_name("A:B")
-                                ->excludes(stepOpt);
-    CLI::Option* staticOpt =
-        dumpCmd->add_option("--static", dumpStatic, "static item N (1-based) instead of time steps")
-            ->check(CLI::PositiveNumber)
-            ->excludes(itemOpt)
-            ->excludes(stepOpt)
-            ->excludes(stepsOpt);
+    addSelection(dumpCmd, dump.select);
+    dumpCmd->add_option("--static", dump.staticItem, "static item N or NAME instead of time steps")
+        ->type_name("ITEM")
+        ->excludes("--item")
+        ->excludes("--time")
+        ->excludes("--nearest");
     dumpCmd->add_option("--format", dumpFormat, "text or csv")->check(CLI::IsMember({"text", "csv"}));
-    int64_t dumpLimit = 0;
-    CLI::Option* limitOpt = dumpCmd->add_option("--limit", dumpLimit, "at most N values per item and time step")
-                                ->check(CLI::NonNegativeNumber);
+    dumpCmd->add_option("--limit", dump.limit, "at most N values per item and time step")
+        ->check(CLI::Validator(countSyntax, "N"));
 
     StatsOptions stats;
-    int32_t statsItem = 0;
-    CLI::App* statsCmd = app.add_subcommand("stats", "Min, max, mean and delete count per item of a gridded file");
+    CLI::App* statsCmd =
+        app.add_subcommand("stats", "Min, max, mean and delete count per item, read from every time step");
     statsCmd->add_option("FILE", stats.file, "the gridded data file")->required();
-    CLI::Option* statsItemOpt =
-        statsCmd->add_option("--item", statsItem, "only item N (1-based)")->check(CLI::PositiveNumber);
+    addSelection(statsCmd, stats.select);
     statsCmd->add_flag("--json", stats.json, "print JSON instead of text");
 
     CheckOptions check;
@@ -115,6 +127,11 @@ int run(int argc, char** argv) {
     repairCmd->add_option("FILE", repair.file, "the gridded data file")->required();
     repairCmd->add_flag("--dry-run", repair.dryRun, "report what would be repaired, change nothing");
     repairCmd->footer("Exit status 0 when the file is consistent afterwards, 1 when it cannot be repaired.");
+
+    // plot is the Python package's: its options pass through untouched.
+    CLI::App* plotCmd = app.add_subcommand("plot", "Picture of an item at a time step (PNG, through Python)");
+    plotCmd->prefix_command();
+    plotCmd->set_help_flag();
 
     UnitsOptions units;
     std::string unitsQuery;
@@ -136,7 +153,7 @@ int run(int argc, char** argv) {
     if (argc > 1 && argv[1][0] != '-' &&
         app.get_subcommands([&](CLI::App* sub) { return sub->get_name() == argv[1]; }).empty()) {
         std::fprintf(stderr,
-                     "tova: unknown subcommand \"%s\" (info, check, repair, units, dump, stats, demo)\n"
+                     "tova: unknown subcommand \"%s\" (info, dump, stats, plot, check, repair, units, demo, convert)\n"
                      "Run with --help for more information.\n",
                      argv[1]);
         return kExitUsage;
@@ -144,7 +161,6 @@ int run(int argc, char** argv) {
 
     try {
         app.parse(argc, argv);
-        if (stepsOpt->count() != 0) dump.steps = parseSteps(dumpSteps);
     } catch (const CLI::ParseError& e) {
         const int code = app.exit(e);  // prints help, the version or the error
         return code == 0 ? kExitOk : kExitUsage;
@@ -158,17 +174,11 @@ int run(int argc, char** argv) {
         return runUnits(units);
     }
     if (dumpCmd->parsed()) {
-        if (itemOpt->count() != 0) dump.item = dumpItem;
-        if (stepOpt->count() != 0) dump.steps = StepRange{dumpStep, dumpStep};
-        if (staticOpt->count() != 0) dump.staticItem = dumpStatic;
-        if (limitOpt->count() != 0) dump.limit = dumpLimit;
         dump.format = dumpFormat == "csv" ? DumpFormat::Csv : DumpFormat::Text;
         return runDump(dump);
     }
-    if (statsCmd->parsed()) {
-        if (statsItemOpt->count() != 0) stats.item = statsItem;
-        return runStats(stats);
-    }
+    if (statsCmd->parsed()) return runStats(stats);
+    if (plotCmd->parsed()) return runPlot(plotCmd->remaining());
     if (demoCmd->parsed()) return runDemo(demo);
     if (convertCmd->parsed()) return runConvert(convertCmd->remaining());
     return kExitUsage;

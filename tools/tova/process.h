@@ -1,5 +1,5 @@
 // Running another program from the tool (the platform layer for it): used by
-// `convert`, which hands its work to the Python package.
+// the commands that hand their work to the Python package (python_command.h).
 #pragma once
 
 #include <string>

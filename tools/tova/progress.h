@@ -1,59 +1,43 @@
-// Progress of a long operation on standard error, shown only when standard
-// error is a terminal and the work is large; the line is cleared at the end.
+// Progress of a long operation on standard error, by bytes: shown only when
+// standard error is a terminal and the work is large (or, for any size, when
+// the environment variable TOVA_PROGRESS is "always"); redrawn four times a
+// second and cleared at the end.
 #pragma once
 
 #include <chrono>
 #include <cstdint>
-#include <cstdio>
-
-#ifdef _WIN32
-#include <io.h>
-#else
-#include <unistd.h>
-#endif
 
 namespace tova_cli {
 
 class Progress {
 public:
-    // Work below minTotal finishes too fast to be worth a progress line.
-    Progress(const char* label, uint64_t total, uint64_t minTotal = 64ull << 20)
-        : label_(label), total_(total), shown_(total >= minTotal && stderrIsTerminal()) {}
-    ~Progress() {
-        if (drawn_) std::fprintf(stderr, "\r%*s\r", 40, "");
-    }
+    // Work below minTotal bytes finishes too fast to be worth a progress line.
+    // quietOutput: standard output must not be a terminal either (a command
+    // that prints its results there, like dump).
+    Progress(const char* label, uint64_t total, uint64_t minTotal = 64ull << 20, bool quietOutput = false);
+    ~Progress();
     Progress(const Progress&) = delete;
     Progress& operator=(const Progress&) = delete;
 
-    // Cheap enough to call per record: the clock is read every 1024 calls.
+    // done: bytes of the work done. Cheap enough to call per record: the
+    // clock is read every 256 calls or when 4 MiB more are done.
     void update(uint64_t done) {
-        if (!shown_ || (++calls_ & 1023u) != 0) return;
-        const auto now = std::chrono::steady_clock::now();
-        // Nothing for work that ends within half a second; then four a second.
-        if (now - (drawn_ ? last_ : start_) < std::chrono::milliseconds(drawn_ ? 250 : 500)) return;
-        last_ = now;
-        drawn_ = true;
-        const double percent = total_ != 0 ? 100.0 * static_cast<double>(done) / static_cast<double>(total_) : 100.0;
-        std::fprintf(stderr, "\r%s %5.1f%%", label_, percent);
-        std::fflush(stderr);
+        if (!shown_) return;
+        if ((++calls_ & 255u) != 0 && done < checked_ + (4u << 20)) return;
+        checked_ = done;
+        draw(done);
     }
 
 private:
-    static bool stderrIsTerminal() {
-#ifdef _WIN32
-        return _isatty(_fileno(stderr)) != 0;
-#else
-        return isatty(fileno(stderr)) != 0;
-#endif
-    }
+    void draw(uint64_t done);
 
     const char* label_;
     uint64_t total_;
-    bool shown_;
+    bool shown_ = false;
     bool drawn_ = false;
     uint32_t calls_ = 0;
-    std::chrono::steady_clock::time_point start_ = std::chrono::steady_clock::now();
-    std::chrono::steady_clock::time_point last_{};
+    uint64_t checked_ = 0;
+    std::chrono::steady_clock::time_point due_;
 };
 
 }  // namespace tova_cli

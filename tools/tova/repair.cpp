@@ -3,8 +3,11 @@
 // library counts the complete time steps (grdFileScan) and rewrites the
 // header's count and time span in place (grdFileRecover); an unfinished time
 // step after them stays on disk, uncounted, and is cut off by the next
-// append. Exit status 0 when the file is consistent afterwards (or would be,
-// with --dry-run), 1 when it cannot be repaired.
+// append. The file goes through the full check first, so that repair and
+// check say the same of it: damage that repair cannot mend (anything but
+// missing or uncounted time steps) is reported as check reports it. Exit
+// status 0 when the file is consistent afterwards (or would be, with
+// --dry-run), 1 when it cannot be repaired.
 #include <string>
 
 #include "grd_commands.h"
@@ -22,6 +25,13 @@ int runRepair(const RepairOptions& options) {
     const RecordFileInfo info = probeRecordFile(options.file);
     if (info.kind != FileKind::Grid) {
         printOut(options.file + ": not a gridded data file: only those can be repaired\n");
+        return kExitFailed;
+    }
+    const Diagnosis diagnosis = diagnose(options.file);
+    if (diagnosis.damaged && !diagnosis.repairable) {
+        const std::string& line = diagnosis.lines.front();
+        const std::string prefix = options.file + ": ";
+        printOut(prefix + "cannot be repaired: " + (line.rfind(prefix, 0) == 0 ? line.substr(prefix.size()) : line) + "\n");
         return kExitFailed;
     }
     int32_t found = 0;

@@ -1,8 +1,10 @@
-// `tova stats FILE [--item N] [--json]`: minimum, maximum, mean and the number
-// of delete values of each item over all time steps, computed by reading
-// every time step, next to the statistics the file stores (the item's
-// extremes and delete count, and with per-element statistics the mean), and
-// whether the two agree.
+// `tova stats FILE [--item ITEM]... [--time WHEN] [--x A:B] [--y A:B] [--z A:B]
+// [--json]`: minimum, maximum, mean and the number of delete values of each
+// item, computed by reading every selected time step; over the whole file
+// next to the statistics the file stores (the item's extremes and delete
+// count, and with per-element statistics the mean), and whether the two
+// agree. A file that turns out damaged gives the statistics of the time
+// steps read before the damage and what `check` says of it.
 #include <algorithm>
 #include <cmath>
 #include <cstring>
@@ -12,6 +14,7 @@
 #include "grd_access.h"
 #include "grd_commands.h"
 #include "progress.h"
+#include "selection.h"
 #include "text.h"
 #include "tova_cli.h"
 
@@ -39,10 +42,10 @@ struct Accumulator {
     double mean() const { return values > 0 ? sum / static_cast<double>(values) : std::nan(""); }
 };
 
-// Adds the stored elements of one time step: all of them, or for a
-// compressed item those at the key positions.
+// Adds the stored elements of one time step in the box: all of them, or for
+// a compressed item those at the key positions.
 template <class T>
-void accumulate(Accumulator& acc, const unsigned char* data, int64_t count, const std::vector<int64_t>& positions,
+void accumulate(Accumulator& acc, const unsigned char* data, const Box& box, const std::vector<int64_t>& positions,
                 bool hasDelete, T deleteValue) {
     const auto one = [&](int64_t e) {
         T v;
@@ -54,32 +57,37 @@ void accumulate(Accumulator& acc, const unsigned char* data, int64_t count, cons
         }
     };
     if (positions.empty()) {
-        for (int64_t e = 0; e < count; ++e) one(e);
+        box.forEachRun([&](int64_t first, int64_t length) {
+            for (int64_t e = first; e < first + length; ++e) one(e);
+        });
     } else {
-        for (const int64_t e : positions) one(e);
+        for (const int64_t e : positions) {
+            if (box.whole() || box.contains(e)) one(e);
+        }
     }
 }
 
 struct ItemWork {
     int32_t number = 0;
     int32_t type = 0;
-    int64_t elements = 0;
+    Box box;
     std::vector<int64_t> positions;  // grid positions of the stored elements of a compressed item
     Accumulator acc;
+    std::vector<unsigned char> values;  // of the time step being read
 };
 
 void addTo(ItemWork& w, HeaderHandle h, const unsigned char* data) {
     switch (w.type) {
-    case RCF_FLOAT: return accumulate<float>(w.acc, data, w.elements, w.positions, true, grdGetDeleteValFloat(h));
-    case RCF_DOUBLE: return accumulate<double>(w.acc, data, w.elements, w.positions, true, grdGetDeleteValDouble(h));
+    case RCF_FLOAT: return accumulate<float>(w.acc, data, w.box, w.positions, true, grdGetDeleteValFloat(h));
+    case RCF_DOUBLE: return accumulate<double>(w.acc, data, w.box, w.positions, true, grdGetDeleteValDouble(h));
     case RCF_BYTE:
-        return accumulate<signed char>(w.acc, data, w.elements, w.positions, true,
+        return accumulate<signed char>(w.acc, data, w.box, w.positions, true,
                                        static_cast<signed char>(grdGetDeleteValByte(h)));
-    case RCF_INT4: return accumulate<int32_t>(w.acc, data, w.elements, w.positions, true, grdGetDeleteValInt(h));
+    case RCF_INT4: return accumulate<int32_t>(w.acc, data, w.box, w.positions, true, grdGetDeleteValInt(h));
     case RCF_UINT4:
-        return accumulate<uint32_t>(w.acc, data, w.elements, w.positions, true, grdGetDeleteValUnsignedInt(h));
-    case RCF_INT2: return accumulate<int16_t>(w.acc, data, w.elements, w.positions, false, int16_t{0});
-    case RCF_UINT2: return accumulate<uint16_t>(w.acc, data, w.elements, w.positions, false, uint16_t{0});
+        return accumulate<uint32_t>(w.acc, data, w.box, w.positions, true, grdGetDeleteValUnsignedInt(h));
+    case RCF_INT2: return accumulate<int16_t>(w.acc, data, w.box, w.positions, false, int16_t{0});
+    case RCF_UINT2: return accumulate<uint16_t>(w.acc, data, w.box, w.positions, false, uint16_t{0});
     default: break;
     }
 }
@@ -120,28 +128,7 @@ Value stored(HeaderHandle h, int32_t n, const Accumulator& acc, bool* agrees) {
     grdGetItemStatsGlobal(item, &minimum, &maximum, &deletes);
     const bool hasExtremes = minimum != none && maximum != none;
 
-    // The mean over all values from the per-element means and counts.
-    double mean = std::nan("");
-    const int32_t type = grdGetItemStatsType(h);
-    if (type == F_ITEM_STATS_ELEMENT || type == F_ITEM_STATS_ELEMENT_ALT) {
-        double sum = 0;
-        int64_t count = 0;
-        const int32_t used = grdGetUsedItemElements(item);
-        for (int32_t e = 0; e < used; ++e) {
-            double elementMean = 0;
-            int32_t values = 0;
-            if (grdGetItemStats(h, n, e, nullptr, nullptr, &elementMean, nullptr, nullptr, &values, nullptr, nullptr) !=
-                F_NO_ERROR) {
-                count = 0;
-                break;
-            }
-            if (values > 0) {
-                sum += elementMean * values;
-                count += values;
-            }
-        }
-        if (count > 0) mean = sum / static_cast<double>(count);
-    }
+    const double mean = storedMean(h, n);
 
     *agrees = deletes == acc.deletes && (hasExtremes ? minimum == acc.minimum && maximum == acc.maximum : acc.values == 0);
     if (std::isfinite(mean) && acc.values > 0) {
@@ -164,51 +151,67 @@ Value stored(HeaderHandle h, int32_t n, const Accumulator& acc, bool* agrees) {
 
 int runStats(const StatsOptions& options) {
     const RecordFileInfo file = probeGridFile(options.file);
-    const GridFile grid(options.file);
+    int32_t opened = 0;
+    const GridFile grid(options.file, &opened);
+    if (opened != F_NO_ERROR) {
+        return reportDamage(options.file, options.file + ": the gridded data-file reader refuses the file: status " +
+                                              statusText(opened));
+    }
     const HeaderHandle h = grid.header();
     const FileHandle f = grid.file();
-    checkItemNumber(h, options.item, options.file);
-    const int32_t items = grdGetNoOfItems(h);
-    const int32_t firstItem = options.item.value_or(1);
-    const int32_t lastItem = options.item.value_or(items);
+    const TimeAxis axis = timeAxis(h);
+    const StepSpan steps = selectSteps(grid, axis, options.select.time, options.select.nearest, options.file);
 
     std::vector<ItemWork> work;
-    size_t largest = 8;
-    for (int32_t n = firstItem; n <= lastItem; ++n) {
+    for (const int32_t n : selectItems(h, options.select.items, options.file)) {
         const ItemHandle item = grdItemD(h, n);
         const Geometry g = itemGeometry(item);
-        ItemWork w;
-        w.number = n;
-        w.type = itemInfo(item).dataType;
-        w.elements = g.elements;
-        const size_t bytes = valueBytes(w.elements, w.type, file.size, options.file + ": item " + std::to_string(n));
+        const ItemInfo info = itemInfo(item);
+        ItemWork w{n, info.dataType, Box(g, options.select.axes, "item " + std::to_string(n) + " \"" + info.name + "\""),
+                   {}, {}, {}};
+        const size_t bytes = valueBytes(g.elements, w.type, file.size, options.file + ": item " + std::to_string(n));
         w.positions = keyPositions(h, item, g);
-        largest = std::max(largest, bytes);
+        w.values.resize(std::max<size_t>(bytes, 8));
         work.push_back(std::move(w));
     }
-    std::vector<unsigned char> values(largest);
 
-    const int64_t steps = timeAxis(h).timeSteps;
+    // Steps are read in file order and items in their order within a step.
+    std::vector<ItemWork*> order;
+    for (ItemWork& w : work) order.push_back(&w);
+    std::sort(order.begin(), order.end(), [](const ItemWork* a, const ItemWork* b) { return a->number < b->number; });
     Progress progress("reading", file.size);
-    for (int64_t t = 0; t < steps; ++t) {
-        const auto step = static_cast<int32_t>(t);
-        const std::string where = options.file + ": time step " + std::to_string(t);
-        const int32_t found = options.item ? grdFindItemDynamic(h, f, step, firstItem) : grdFindTimeStep(h, f, step);
-        if (found != F_NO_ERROR) throw Failure(where + ": status " + statusText(found));
-        for (ItemWork& w : work) {
-            double time = 0;
-            const int32_t status = grdReadItemTimeStep(h, f, &time, values.data());
-            if (status != F_NO_ERROR) {
-                throw Failure(where + ", item " + std::to_string(w.number) + ": status " + statusText(status));
+    std::string failure;
+    int64_t done = 0;
+    try {
+        for (int64_t t = steps.first; t <= steps.last; ++t, ++done) {
+            const auto step = static_cast<int32_t>(t);
+            for (ItemWork* w : order) {
+                const std::string where = options.file + ": time step " + std::to_string(t) + ", item " + std::to_string(w->number);
+                const int32_t found = grdFindItemDynamic(h, f, step, w->number);
+                if (found != F_NO_ERROR) throw Failure(where + ": status " + statusText(found));
+                double time = 0;
+                const int32_t status = grdReadItemTimeStep(h, f, &time, w->values.data());
+                if (status != F_NO_ERROR) throw Failure(where + ": status " + statusText(status));
+                progress.update(static_cast<uint64_t>(std::max<int64_t>(rcfTell64(f), 0)));
             }
-            addTo(w, h, values.data());
+            // A step counts once it was read whole.
+            for (ItemWork& w : work) addTo(w, h, w.values.data());
         }
-        progress.update(static_cast<uint64_t>(rcfTell64(f)));
+    } catch (const Failure& e) {
+        failure = e.what();
     }
+    // The stored statistics describe every value of every step.
+    bool whole = failure.empty() && steps.first == 0 && steps.last == axis.timeSteps - 1;
+    for (const ItemWork& w : work) whole = whole && w.box.whole();
 
     Value doc = Value::object();
     doc.add("file", options.file);
-    doc.add("timeSteps", steps);
+    doc.add("timeSteps", done);
+    if (done > 0) {
+        Value& read = doc.add("stepsRead", Value::array());
+        read.push(steps.first);
+        read.push(steps.first + done - 1);
+    }
     doc.add("statisticsType", grdGetItemStatsType(h));
     Value computed = Value::array();
     Value kept = Value::array();
@@ -224,18 +227,23 @@ int runStats(const StatsOptions& options) {
         row.add("minimum", extreme(w.acc.values > 0 ? w.acc.minimum : std::nan(""), w.type));
         row.add("maximum", extreme(w.acc.values > 0 ? w.acc.maximum : std::nan(""), w.type));
         row.add("mean", number(w.acc.mean()));
-        bool agrees = false;
-        kept.push(stored(h, w.number, w.acc, &agrees));
-        allAgree = allAgree && agrees;
+        if (whole) {
+            bool agrees = false;
+            kept.push(stored(h, w.number, w.acc, &agrees));
+            allAgree = allAgree && agrees;
+        }
     }
     doc.add("computed", std::move(computed));
-    doc.add("stored", std::move(kept));
+    if (whole) doc.add("stored", std::move(kept));
     if (!allAgree) {
         doc.add("note", "the stored statistics differ from the values read: the data may have been changed after "
                         "they were written");
     }
+    if (!failure.empty()) {
+        doc.add("note", "the file is damaged: these are the statistics of the time steps before the damage");
+    }
     printOut(options.json ? toJson(doc) : toText(doc));
-    return kExitOk;
+    return failure.empty() ? kExitOk : reportDamage(options.file, failure);
 }
 
 }  // namespace tova_cli

@@ -69,6 +69,7 @@ Value describeRecordFile(const RecordFileInfo& file);
 // Subcommands (main.cpp wires their options). Each returns the exit code.
 struct InfoOptions {
     std::string file;
+    std::optional<std::string> item;  // one item in full, by number or name
     bool json = false;
 };
 int runInfo(const InfoOptions& options);

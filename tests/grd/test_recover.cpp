@@ -11,10 +11,11 @@
 #include <string>
 #include <vector>
 
+#include "test_lifecycle_support.h"
+#if TOVA_TEST_POSIX
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include "test_lifecycle_support.h"
+#endif
 
 using namespace grdtest;
 namespace fs = std::filesystem;
@@ -253,6 +254,9 @@ TEST_F(RecoverTest, ForeignRecordsEndTheWalk) {
 // every complete step reads back as written, and appending after recovery
 // gives a valid file.
 TEST_F(RecoverTest, WritersKilledAtRandomMoments) {
+#if !TOVA_TEST_POSIX
+    TOVA_TEST_SKIP_WITHOUT_POSIX();
+#else
     std::mt19937 random(20240321);
     for (int trial = 0; trial < 24; ++trial) {
         const int32_t fileType = trial % 2 == 0 ? F_EQTIME_FIXEDSPACE_ALLITEMS : F_NEQTIME_FIXEDSPACE_ALLITEMS;
@@ -309,6 +313,7 @@ TEST_F(RecoverTest, WritersKilledAtRandomMoments) {
         fs::remove(path);
     }
     EXPECT_EQ(takeCodes(), Codes{});
+#endif
 }
 
 }  // namespace

@@ -110,7 +110,8 @@ protected:
     // then drops the writer without the close's header update.
     static void abandon(const std::string& path, const std::string& crashed, HeaderHandle* h, FileHandle* f) {
         ASSERT_EQ(std::fflush((*f)->stream), 0);
-        fs::copy_file(path, crashed, fs::copy_options::overwrite_existing);
+        fs::remove(crashed);  // MinGW's copy_file cannot overwrite
+        fs::copy_file(path, crashed);
         rcfFileClose(f);
         grdHeaderDestroy(h);
     }

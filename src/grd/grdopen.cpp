@@ -10,15 +10,7 @@
 #include <cctype>
 #include <cstdio>
 #include <cstring>
-#include <filesystem>
 #include <string>
-#include <system_error>
-
-#ifdef _WIN32
-#include <io.h>
-#else
-#include <unistd.h>
-#endif
 
 #include "common/capi.h"
 #include "grd/fileio.h"
@@ -26,6 +18,7 @@
 #include "grd/grdrecover.h"
 #include "grd/grdstatic.h"
 #include "grd/grdstream.h"
+#include "platform/platform.h"
 #include "qty/qty.h"
 #include "tova/workspace.h"
 
@@ -39,14 +32,8 @@ int32_t report(HeaderHandle header, FileHandle file, int32_t code, int32_t line)
 
 // ---- Names -----------------------------------------------------------------------
 
-enum class PathKind { Missing, File, Directory };
-
-PathKind pathKind(const char* name) {
-    std::error_code ec;
-    const auto st = std::filesystem::status(std::filesystem::path(name), ec);
-    if (ec || !std::filesystem::exists(st)) return PathKind::Missing;
-    return std::filesystem::is_directory(st) ? PathKind::Directory : PathKind::File;
-}
+using platform::PathKind;
+using platform::pathKind;
 
 bool emptyName(const char* name) { return name == nullptr || name[0] == '\0'; }
 
@@ -64,19 +51,14 @@ bool isLegacyName(const char* name) {
 }
 
 // Replaces a shell shortcut by its target; false when it cannot be resolved.
-// Outside Windows there are no shell shortcuts: a name ending in .lnk is an
+// Where the system has no shell shortcuts a name ending in .lnk is an
 // ordinary file.
 bool resolveShortcut(std::string& name) {
-#ifdef _WIN32
-    if (TdShortCut_IsShortcut(name.c_str()) == 0) return true;
+    if (!platform::shortcutsResolve() || TdShortCut_IsShortcut(name.c_str()) == 0) return true;
     char target[1024] = {};
     if (TdShortCut_ResolveShortcut(name.c_str(), target) < 0 || target[0] == '\0') return false;
     name = target;
     return true;
-#else
-    (void)name;
-    return true;
-#endif
 }
 
 // ---- Opening -------------------------------------------------------------------
@@ -180,11 +162,7 @@ int32_t sectionAtEnd(FileHandle file, uint32_t* section) {
 bool truncateAt(FileHandle file, int64_t offset) {
     grdSeekTo(file, offset);
     if (std::fflush(file->stream) != 0) return false;
-#ifdef _WIN32
-    if (_chsize_s(_fileno(file->stream), offset) != 0) return false;
-#else
-    if (ftruncate(fileno(file->stream), static_cast<off_t>(offset)) != 0) return false;
-#endif
+    if (!platform::streamTruncate(file->stream, offset)) return false;
     file->knownSize = offset;
     return true;
 }

@@ -18,18 +18,10 @@
 #include <type_traits>
 #include <utility>
 
-#ifdef _WIN32
-#ifndef NOMINMAX
-#define NOMINMAX
-#endif
-#include <windows.h>
-#else
-#include <dlfcn.h>
-#endif
-
 #include "common/capi.h"
 #include "grd/grdio.h"
 #include "grd/grdplugin.h"
+#include "platform/platform.h"
 #include "rcf/rcf_internal.h"
 #include "tova/grdext.h"
 
@@ -56,46 +48,25 @@ public:
     // bare file name, so the search never looks in the data file's folder.
     bool open(int64_t number) {
         char name[64];
-#if defined(_WIN32)
-        std::snprintf(name, sizeof name, "grdExt_%" PRId64 ".dll", number);
-        handle_ = LoadLibraryA(name);
-#elif defined(__APPLE__)
-        std::snprintf(name, sizeof name, "grdExt_%" PRId64 ".dylib", number);
-        handle_ = dlopen(name, RTLD_NOW | RTLD_LOCAL);
-#else
-        std::snprintf(name, sizeof name, "grdExt_%" PRId64 ".so", number);
-        handle_ = dlopen(name, RTLD_NOW | RTLD_LOCAL);
-#endif
+        std::snprintf(name, sizeof name, "grdExt_%" PRId64 "%s", number, platform::kSharedLibrarySuffix);
+        handle_ = platform::libraryLoad(name);
         return handle_ != nullptr;
     }
 
     // The entry point name as Fn, or null.
     template <class Fn>
     Fn symbol(const char* name) const {
-#ifdef _WIN32
-        // Through the generic function type, which any function type converts to.
-        return reinterpret_cast<Fn>(reinterpret_cast<void (*)()>(GetProcAddress(handle_, name)));
-#else
-        return reinterpret_cast<Fn>(dlsym(handle_, name));
-#endif
+        return reinterpret_cast<Fn>(platform::librarySymbol(handle_, name));
     }
 
     void close() {
         if (handle_ == nullptr) return;
-#ifdef _WIN32
-        FreeLibrary(handle_);
-#else
-        dlclose(handle_);
-#endif
+        platform::libraryFree(handle_);
         handle_ = nullptr;
     }
 
 private:
-#ifdef _WIN32
-    HMODULE handle_ = nullptr;
-#else
     void* handle_ = nullptr;
-#endif
 };
 
 struct EntryPoints {

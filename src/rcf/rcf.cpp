@@ -3,10 +3,6 @@
 // transfers with byte swapping for foreign-order files, the record-header
 // look-ahead, deferred and short skips, positioning, logical records and the
 // simple-type table. Blocks and record lists live in rcfblock.cpp.
-#if !defined(_WIN32) && !defined(_FILE_OFFSET_BITS)
-#define _FILE_OFFSET_BITS 64
-#endif
-
 #include <algorithm>
 #include <array>
 #include <atomic>
@@ -14,17 +10,11 @@
 #include <cstdlib>
 #include <cstring>
 #include <ctime>
-#include <filesystem>
 #include <new>
 #include <string>
 
-#include <sys/stat.h>
-#include <sys/types.h>
-#ifdef _WIN32
-#include <stdlib.h>
-#endif
-
 #include "common/capi.h"
+#include "platform/platform.h"
 #include "rcf/rcf_internal.h"
 
 namespace {
@@ -46,54 +36,13 @@ constexpr uint64_t kSmallRecordBytes = 64;
 
 // ---- Platform: 64-bit stream positions, file length, local time ----------
 
-// A file is used by one thread at a time, so the transfers take the stream
-// functions that skip the stream's lock where the C library has them: for
-// small records the lock costs as much as the copy.
-#if defined(_WIN32)
-inline size_t streamRead(void* p, size_t n, std::FILE* f) { return _fread_nolock(p, 1, n, f); }
-inline size_t streamWrite(const void* p, size_t n, std::FILE* f) { return _fwrite_nolock(p, 1, n, f); }
-inline int streamGetc(std::FILE* f) { return _getc_nolock(f); }
-#elif defined(__GLIBC__)
-inline size_t streamRead(void* p, size_t n, std::FILE* f) { return fread_unlocked(p, 1, n, f); }
-inline size_t streamWrite(const void* p, size_t n, std::FILE* f) { return fwrite_unlocked(p, 1, n, f); }
-inline int streamGetc(std::FILE* f) { return getc_unlocked(f); }
-#else
-inline size_t streamRead(void* p, size_t n, std::FILE* f) { return std::fread(p, 1, n, f); }
-inline size_t streamWrite(const void* p, size_t n, std::FILE* f) { return std::fwrite(p, 1, n, f); }
-inline int streamGetc(std::FILE* f) { return getc_unlocked(f); }
-#endif
-
-#ifdef _WIN32
-int streamSeek(std::FILE* f, int64_t offset, int whence) { return _fseeki64(f, offset, whence); }
-int64_t streamTell(std::FILE* f) { return _ftelli64(f); }
-int64_t streamLength(std::FILE* f) {
-    struct _stat64 st;
-    return _fstat64(_fileno(f), &st) == 0 ? static_cast<int64_t>(st.st_size) : -1;
-}
-bool localNow(std::tm& out) {
-    const std::time_t now = std::time(nullptr);
-    return localtime_s(&out, &now) == 0;
-}
-const char* withCloseOnExec(const char* mode, std::string&) { return mode; }
-#else
-static_assert(sizeof(off_t) >= 8, "record files need 64-bit stream positions");
-int streamSeek(std::FILE* f, int64_t offset, int whence) { return fseeko(f, static_cast<off_t>(offset), whence); }
-int64_t streamTell(std::FILE* f) { return static_cast<int64_t>(ftello(f)); }
-int64_t streamLength(std::FILE* f) {
-    struct stat st;
-    return fstat(fileno(f), &st) == 0 ? static_cast<int64_t>(st.st_size) : -1;
-}
-bool localNow(std::tm& out) {
-    const std::time_t now = std::time(nullptr);
-    return localtime_r(&now, &out) != nullptr;
-}
-// Streams are not inherited by child processes.
-const char* withCloseOnExec(const char* mode, std::string& buffer) {
-    buffer = mode;
-    buffer += 'e';
-    return buffer.c_str();
-}
-#endif
+using platform::localNow;
+using platform::streamGetc;
+using platform::streamLength;
+using platform::streamRead;
+using platform::streamSeek;
+using platform::streamTell;
+using platform::streamWrite;
 
 #if defined(_MSC_VER)
 inline uint16_t bswap(uint16_t v) { return _byteswap_ushort(v); }
@@ -148,14 +97,8 @@ char* newText(const std::string& text) {
     return copy;
 }
 
-// Absolute, lexically normalised path; the name as given when that fails.
-char* fullPath(const char* path) {
-    std::string full = path;
-    std::error_code ec;
-    const std::filesystem::path absolute = std::filesystem::absolute(std::filesystem::path(path), ec);
-    if (!ec) full = absolute.lexically_normal().string();
-    return newText(full);
-}
+// The full path; the name as given when that fails.
+char* fullPath(const char* path) { return newText(platform::fullPath(path)); }
 
 // ---- Handler table of this layer ----------------------------------------
 
@@ -357,8 +300,7 @@ FilePtr newFile() {
 }
 
 bool openStream(RcfFile* h, const char* path, const char* mode) {
-    std::string modeBuffer;
-    h->stream = std::fopen(path, withCloseOnExec(mode, modeBuffer));
+    h->stream = platform::streamOpen(path, mode);
     if (h->stream == nullptr) return false;
     // Only files being created ("wb", "wb+") write straight on; the others jump.
     const bool jumps = std::strcmp(mode, "rb") == 0 || std::strcmp(mode, "rb+") == 0;

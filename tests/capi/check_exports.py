@@ -1,11 +1,49 @@
 #!/usr/bin/env python3
 """Compares the dynamic symbols of the shared libraries with the functions the
 public headers mark for export: every marked function is exported and nothing
-else is (no internal function, no C++ symbol)."""
+else is (no internal function, no C++ symbol). Windows DLLs are read from
+their export tables, where every name must be plain (no "_name@bytes" of a
+decorated __stdcall function)."""
 import pathlib
 import re
+import struct
 import subprocess
 import sys
+
+
+def pe_exports(data):
+    """The exported names of a PE image (DLL), from its export directory."""
+    (pe,) = struct.unpack_from("<I", data, 0x3C)
+    if data[pe:pe + 4] != b"PE\0\0":
+        raise ValueError("not a PE image")
+    sections, optional_size = struct.unpack_from("<H12xH", data, pe + 6)
+    optional = pe + 24
+    (magic,) = struct.unpack_from("<H", data, optional)
+    directories = optional + (96 if magic == 0x10B else 112)
+    export_rva, _ = struct.unpack_from("<II", data, directories)
+    table = []
+    for i in range(sections):
+        at = optional + optional_size + 40 * i
+        size, rva, raw_size, raw = struct.unpack_from("<IIII", data, at + 8)
+        table.append((rva, max(size, raw_size), raw))
+
+    def offset(rva):
+        for start, size, raw in table:
+            if start <= rva < start + size:
+                return rva - start + raw
+        raise ValueError(f"address {rva:#x} outside every section")
+
+    if export_rva == 0:
+        return set()
+    count, _, names = struct.unpack_from("<III", data, offset(export_rva) + 24)
+    names = offset(names)
+    exported = set()
+    for i in range(count):
+        (name_rva,) = struct.unpack_from("<I", data, names + 4 * i)
+        start = offset(name_rva)
+        exported.add(data[start:data.index(b"\0", start)].decode("ascii"))
+    return exported
+
 
 include = pathlib.Path(sys.argv[1])
 libs = sys.argv[2:]
@@ -20,6 +58,10 @@ for header in include.rglob("*.h"):
 
 exported = set()
 for lib in libs:
+    data = pathlib.Path(lib).read_bytes()
+    if data[:2] == b"MZ":
+        exported |= pe_exports(data)
+        continue
     out = subprocess.run(["nm", "-D", "--defined-only", lib], capture_output=True, text=True, check=True).stdout
     for line in out.splitlines():
         parts = line.split()

@@ -7,19 +7,29 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <random>
 #include <string>
 #include <vector>
 
-#include <unistd.h>
+// POSIX process services (fork, pipes, resource limits, /proc): the tests
+// that need them are built as skipped tests, saying so, where there are none.
+#if defined(_WIN32)
+#define TOVA_TEST_POSIX 0
+#else
+#define TOVA_TEST_POSIX 1
+#endif
+#define TOVA_TEST_SKIP_WITHOUT_POSIX() GTEST_SKIP() << "needs POSIX processes (fork, resource limits)"
 
 namespace testutil {
 
 class TempDir {
 public:
     TempDir() {
+        // A token per process keeps test programs that run side by side apart.
+        static const std::string process = std::to_string(std::random_device{}());
         static std::atomic<int> counter{0};
         path_ = std::filesystem::temp_directory_path() /
-                ("tova-test-" + std::to_string(::getpid()) + "-" + std::to_string(counter++));
+                ("tova-test-" + process + "-" + std::to_string(counter++));
         std::filesystem::remove_all(path_);
         std::filesystem::create_directories(path_);
     }

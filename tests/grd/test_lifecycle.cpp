@@ -161,7 +161,11 @@ TEST_F(LifecycleTest, LegacyNamesAreRefusedAndOthersAreOrdinary) {
     EXPECT_EQ(takeCodes(), Codes{2010});
 
     // .dt5 and, outside Windows, .lnk are ordinary data files.
+#ifdef _WIN32
+    for (const char* name : {"new.dt5", "new.DT"}) {
+#else
     for (const char* name : {"new.dt5", "new.DT", "link.lnk"}) {
+#endif
         const std::string path = dir_.file(name);
         create(path);
         close();
@@ -347,6 +351,9 @@ TEST_F(LifecycleTest, FlushThrottle) {
 // When the final header update fails the file stays open with its data; the
 // caller may retry.
 TEST_F(LifecycleTest, CloseRefusesWhenTheUpdateFails) {
+#ifdef _WIN32
+    GTEST_SKIP() << "an open file cannot be renamed away on Windows";
+#endif
     makeFileHeader();
     const std::string path = dir_.file("retry.grd");
     const std::string away = dir_.file("away.grd");

@@ -11,10 +11,11 @@
 #include <string>
 #include <vector>
 
+#include "common/testutil.h"
+#if TOVA_TEST_POSIX
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include "common/testutil.h"
+#endif
 #include "rcf/rcf_internal.h"
 
 namespace rcftest {
@@ -107,6 +108,7 @@ inline std::vector<uint8_t> swappedFile() {
     return toBytes(b);
 }
 
+#if TOVA_TEST_POSIX
 // Runs fn in a forked child and returns its result (or -1 when the child
 // did not end normally). Used for checks under resource limits.
 inline int runInChild(const std::function<int()>& fn) {
@@ -134,5 +136,8 @@ inline int openDescriptors() {
     for ([[maybe_unused]] const auto& entry : std::filesystem::directory_iterator("/proc/self/fd")) ++n;
     return n;
 }
+#else
+inline int openDescriptors() { return 0; }  // not counted without /proc
+#endif
 
 }  // namespace rcftest

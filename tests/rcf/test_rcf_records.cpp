@@ -9,9 +9,11 @@
 #include <vector>
 
 #include <csignal>
-#include <sys/resource.h>
 
 #include "rcf_testutil.h"
+#if TOVA_TEST_POSIX
+#include <sys/resource.h>
+#endif
 
 // Sanitizers reserve far more address space than any limit a test can set.
 #if defined(__has_feature)
@@ -22,7 +24,7 @@
 #define TOVA_TEST_ADDRESS_LIMIT 0
 #endif
 #ifndef TOVA_TEST_ADDRESS_LIMIT
-#define TOVA_TEST_ADDRESS_LIMIT 1
+#define TOVA_TEST_ADDRESS_LIMIT TOVA_TEST_POSIX
 #endif
 
 using namespace rcftest;
@@ -403,6 +405,9 @@ TEST(RcfLimits, ASkipStopsAtTheEndOfTheFile) {
 TEST(RcfLimits, AFailedWriteIsReportedAs2002) {
     TempDir dir;
     const std::string path = dir.file("w.rcf");
+#if !TOVA_TEST_POSIX
+    TOVA_TEST_SKIP_WITHOUT_POSIX();
+#else
     const int status = runInChild([&] {
         std::signal(SIGXFSZ, SIG_IGN);
         struct rlimit limit {};
@@ -418,6 +423,7 @@ TEST(RcfLimits, AFailedWriteIsReportedAs2002) {
         return first == again ? first : -4;
     });
     EXPECT_EQ(status, F_ERR_WRITE);
+#endif
 }
 
 namespace {

@@ -34,7 +34,8 @@ TEST(Workspace, CreateFolderFailsBelowAFile) {
     testutil::writeBytes(dir.file("blocker"), {1});
     EXPECT_EQ(TdCreateFolder(dir.file("blocker/sub/f.dat").c_str()), 0);
     EXPECT_EQ(TdCreateFolder(nullptr), 0);
-    // Long paths are no problem.
+    // Long paths are no problem (beyond the Windows shell's 260 characters).
+    if (!TOVA_TEST_POSIX) return;
     std::string deep = dir.path().string();
     for (int i = 0; i < 40; ++i) deep += "/folder_with_a_long_name_" + std::to_string(i);
     EXPECT_EQ(TdCreateFolder((deep + "/f.dat").c_str()), 1);
@@ -55,6 +56,9 @@ TEST(Workspace, ProjectVariableNeedsFourTokensAndANonZeroHexHandle) {
 }
 
 TEST(Workspace, ProjectAddFileHasNoHostHere) {
+#if !TOVA_TEST_POSIX
+    GTEST_SKIP() << "Windows has host windows: the Windows tests send to one";
+#else
     ::unsetenv("TDPROJECTXXXXX");
     EXPECT_EQ(TdProject_AddFile("/tmp/a.grd"), -1);
     ::setenv("TDPROJECTXXXXX", "a&b&c&0", 1);
@@ -62,6 +66,7 @@ TEST(Workspace, ProjectAddFileHasNoHostHere) {
     ::setenv("TDPROJECTXXXXX", "a&b&c&1234", 1);
     EXPECT_EQ(TdProject_AddFile("/tmp/a.grd"), -1);
     ::unsetenv("TDPROJECTXXXXX");
+#endif
 }
 
 TEST(Workspace, ShortcutsAreRecognisedByExtensionOnly) {
@@ -72,6 +77,6 @@ TEST(Workspace, ShortcutsAreRecognisedByExtensionOnly) {
     EXPECT_EQ(TdShortCut_IsShortcut(nullptr), 0);
 
     char target[260] = "unchanged";
-    EXPECT_LT(TdShortCut_ResolveShortcut("file.lnk", target), 0);
+    EXPECT_LT(TdShortCut_ResolveShortcut("no-such-file.lnk", target), 0);
     EXPECT_STREQ(target, "");
 }

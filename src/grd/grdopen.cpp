@@ -362,7 +362,7 @@ int32_t flushFile(HeaderHandle header, FileHandle file, Update update, bool sync
     if (status == F_NO_ERROR) status = update(header, sync ? 1 : forceFlag(header), file);
     TdProject_AddFile(file->filname);
     if (status == F_NO_ERROR && file->error > F_EOF) status = file->error;
-    if (status == F_NO_ERROR && sync && !rcfStreamSync(file->stream)) status = report(header, file, F_ERR_FLUSH, __LINE__);
+    if (status == F_NO_ERROR && sync && !platform::streamSync(file->stream)) status = report(header, file, F_ERR_FLUSH, __LINE__);
     return status;
 }
 

@@ -51,6 +51,10 @@ int64_t streamLength(std::FILE* f);
 // stream first. True on success.
 bool streamTruncate(std::FILE* f, int64_t length);
 
+// Flushes the stream and has the system put the file on its storage device
+// (durability against power loss). True on success.
+bool streamSync(std::FILE* f);
+
 // ---- Time ----------------------------------------------------------------------
 
 // The current local time; false when the system cannot give it.

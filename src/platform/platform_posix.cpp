@@ -46,6 +46,8 @@ bool streamTruncate(std::FILE* f, int64_t length) {
     return ftruncate(fileno(f), static_cast<off_t>(length)) == 0;
 }
 
+bool streamSync(std::FILE* f) { return std::fflush(f) == 0 && fsync(fileno(f)) == 0; }
+
 bool localNow(std::tm& out) {
     const std::time_t now = std::time(nullptr);
     return localtime_r(&now, &out) != nullptr;

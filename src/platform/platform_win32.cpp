@@ -81,6 +81,9 @@ bool streamTruncate(std::FILE* f, int64_t length) {
     return cut;
 }
 
+// _commit calls FlushFileBuffers on the file's handle.
+bool streamSync(std::FILE* f) { return std::fflush(f) == 0 && _commit(_fileno(f)) == 0; }
+
 bool localNow(std::tm& out) {
     const __time64_t now = _time64(nullptr);
     return _localtime64_s(&out, &now) == 0;

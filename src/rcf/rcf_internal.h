@@ -96,10 +96,6 @@ void rcfSeekAppBase(FileHandle h);
 bool rcfAllocationFails() noexcept;
 int32_t rcfTestFailAllocation(int32_t nth) noexcept;
 
-// Flushes the stream and has the system write its file to the storage
-// device (fsync, FlushFileBuffers); false when either fails.
-bool rcfStreamSync(std::FILE* stream);
-
 // Monotonic milliseconds, the clock of openClock (flush throttles compare against it).
 uint32_t rcfClockMs();
 // This layer's own status reporter (module "rcf"); returns code.

@@ -434,7 +434,10 @@ TOVA_API int32_t TOVA_CALL grdStaticSkip(FileHandle file);
 
 /* ---- Dynamic time-step data --------------------------------------------------
  * Calls never name an item or a time step: the header's cursor (next item,
- * time steps done) decides, and every write, read or skip advances it. */
+ * time steps done) decides, and every write, read or skip advances it.
+ * A file handle belongs to the header it was created with or read into:
+ * these calls, positioning, flush, close and grdEnablePlugin refuse a file
+ * of another header with 1000 and change nothing. */
 TOVA_API int32_t TOVA_CALL grdWriteStartBlockDynamic(HeaderHandle header, FileHandle file);
 TOVA_API int32_t TOVA_CALL grdWriteItemTimeStep(HeaderHandle header, FileHandle file, double time,
                                                 const void* data);

@@ -53,6 +53,11 @@ struct RcfFile {
     // moves while the file is open, so positioning can go there at once.
     int64_t dynamicStart = -1;
     int64_t timeStepLength = 0;
+    // For the gridded-data layer: the serial number of the header that the
+    // file was created with or read into (0: none yet). Data calls with any
+    // other header are refused, so that one file never receives the layout
+    // of another.
+    uint64_t headerSerial = 0;
 
     RcfFile() = default;
     RcfFile(const RcfFile&) = delete;

@@ -164,7 +164,9 @@ TOVA_API int32_t TOVA_CALL grdGetGeoInfoUTMProj(HeaderHandle header, const char*
 TOVA_API int32_t TOVA_CALL grdSetGeoInfoUndefined(HeaderHandle header);
 
 /* Custom blocks: named arrays of a simple type (1-7) kept in insertion order.
- * Other types keep their name and count but no data. */
+ * grdAddCustomBlock refuses another type or a negative count with 2010, a
+ * null name (or null data for a count above 0) with 1000, and then adds
+ * nothing. A block read from a file keeps the type stored there. */
 TOVA_API int32_t TOVA_CALL grdAddCustomBlock(HeaderHandle header, int32_t simpleType, const char* name,
                                              int32_t count, const void* data);
 /* The first block, null when there is none. */

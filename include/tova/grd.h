@@ -340,8 +340,13 @@ TOVA_API int32_t TOVA_CALL grdGetItemAxisTvarD3(ItemHandle item, int32_t* unit, 
 /* ---- Time axes ------------------------------------------------------------
  * Equidistant kinds belong to file types 1 and 2, non-equidistant kinds to
  * 4, 8 and 16: the other family gives 1000, an unknown file type 2010.
- * Calendar dates are "yyyy-mm-dd", times "hh:mm:ss" (digits are not
- * range-checked): 2011 / 2012 otherwise. */
+ * Calendar dates are "yyyy-mm-dd", times "hh:mm:ss": 2011 / 2012 otherwise.
+ * A malformed text leaves the new axis type set (and a malformed time the new
+ * date stored); a well-formed date or time that does not exist (month 13,
+ * 30 February, 29 February outside leap years, 24:00:00, minute or second
+ * 60) gives the same status and changes nothing. Calendar axes read from a
+ * file keep the texts stored there; fields out of range carry over when the
+ * start is advanced by the offset. */
 
 TOVA_API int32_t TOVA_CALL grdSetEqTimeAxis(HeaderHandle header, int32_t unit, double startTime, double timeStep,
                                             int32_t firstIndex);

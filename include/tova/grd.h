@@ -164,9 +164,7 @@ TOVA_API int32_t TOVA_CALL grdGetGeoInfoUTMProj(HeaderHandle header, const char*
 TOVA_API int32_t TOVA_CALL grdSetGeoInfoUndefined(HeaderHandle header);
 
 /* Custom blocks: named arrays of a simple type (1-7) kept in insertion order.
- * grdAddCustomBlock refuses another type or a negative count with 2010, a
- * null name (or null data for a count above 0) with 1000, and then adds
- * nothing. A block read from a file keeps the type stored there. */
+ * Other types keep their name and count but no data. */
 TOVA_API int32_t TOVA_CALL grdAddCustomBlock(HeaderHandle header, int32_t simpleType, const char* name,
                                              int32_t count, const void* data);
 /* The first block, null when there is none. */
@@ -340,13 +338,8 @@ TOVA_API int32_t TOVA_CALL grdGetItemAxisTvarD3(ItemHandle item, int32_t* unit, 
 /* ---- Time axes ------------------------------------------------------------
  * Equidistant kinds belong to file types 1 and 2, non-equidistant kinds to
  * 4, 8 and 16: the other family gives 1000, an unknown file type 2010.
- * Calendar dates are "yyyy-mm-dd", times "hh:mm:ss": 2011 / 2012 otherwise.
- * A malformed text leaves the new axis type set (and a malformed time the new
- * date stored); a well-formed date or time that does not exist (month 13,
- * 30 February, 29 February outside leap years, 24:00:00, minute or second
- * 60) gives the same status and changes nothing. Calendar axes read from a
- * file keep the texts stored there; fields out of range carry over when the
- * start is advanced by the offset. */
+ * Calendar dates are "yyyy-mm-dd", times "hh:mm:ss" (digits are not
+ * range-checked): 2011 / 2012 otherwise. */
 
 TOVA_API int32_t TOVA_CALL grdSetEqTimeAxis(HeaderHandle header, int32_t unit, double startTime, double timeStep,
                                             int32_t firstIndex);

@@ -76,12 +76,8 @@ typedef struct XsecData {
 typedef struct XsecTable* XsecTableHandle;
 /* A cross section: the record inside it. */
 typedef XsecData* XsecHandle;
-/* A search cursor. Cursors belong to the library; callers never free them.
- * A cursor stays valid as long as its table: xfsXsecTableFree frees the
- * cursors of the table (find-next then answers null for them, as for any
- * cursor of a freed table). A table keeps at most its 1024 most recently
- * used cursors (used: by a find or a find-next): a find beyond them moves
- * the one used longest ago. */
+/* A search cursor. Cursors belong to the library and live until it is
+ * unloaded; callers never free them. */
 typedef struct CTDxRef* XsecCursor;
 
 /* Flag bit 0 of xfsXsecTableLoad: load keys and headers only, drop the data
@@ -148,10 +144,8 @@ TOVA_API int32_t TOVA_CALL xfsXsecWrite(XsecHandle xsec, FileHandle file);
 /* Finds the first cross section with these keys (names without regard to
  * case, key value exactly) and leaves *cursor on the one after it. Two empty
  * names with key value 0.0 start a walk: the first cross section of the table
- * is returned. A cursor is stored in *cursor (when cursor is not null) on
- * every call, before anything else is checked: the one *cursor already holds
- * when that is a cursor of this table (it is moved, so repeated finds into
- * one variable use no more memory), else a new one. */
+ * is returned. A cursor is made and stored in *cursor (when cursor is not
+ * null) on every call, before anything else is checked. */
 TOVA_API XsecHandle TOVA_CALL xfsXsecFind(XsecTableHandle table, const char* primaryName, double keyValue,
                                           const char* secondaryName, XsecCursor* cursor);
 /* The cross section under the cursor, moving the cursor one on; null at the

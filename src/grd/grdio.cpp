@@ -311,12 +311,9 @@ int32_t TOVA_CALL grdAddCustomBlock(HeaderHandle header, int32_t simpleType, con
     return withHeader(
         header, __LINE__,
         [&](HeaderHandle h) {
-            // A block of a type without values on disk would lose its data
-            // and its type on the way through a file: refused, as are a
-            // missing name and missing data.
             const int32_t width = grdSimpleTypeSize(simpleType);
-            if (width == 0 || count < 0) return grdReportError(h, nullptr, 0, F_ERR_VALUE, kModule, __LINE__);
-            if (name == nullptr || (count > 0 && data == nullptr))
+            if (count < 0) return grdReportError(h, nullptr, 0, F_ERR_VALUE, kModule, __LINE__);
+            if (width > 0 && count > 0 && data == nullptr)
                 return grdReportError(h, nullptr, 0, F_ERR_ARGUMENT, kModule, __LINE__);
             std::unique_ptr<GrdCustomBlock>* end = &h->customBlocks;
             while (*end) end = &(*end)->next;
@@ -327,14 +324,16 @@ int32_t TOVA_CALL grdAddCustomBlock(HeaderHandle header, int32_t simpleType, con
             block->count = count;
             // A block whose name or data cannot be copied stays in the chain.
             int32_t status = F_NO_ERROR;
-            if (!block->name.assign(name))
+            if (!block->name.assign(name ? name : ""))
                 status = grdReportError(h, nullptr, 0, F_ERR_MEMORY, kModule, __LINE__);
-            const int64_t bytes = int64_t{count} * width;
-            block->data = grdAllocArray<unsigned char>(bytes);
-            if (!block->data) {
-                if (status == F_NO_ERROR) status = grdReportError(h, nullptr, 0, F_ERR_MEMORY, kModule, __LINE__);
-            } else if (bytes > 0) {
-                std::memcpy(block->data.get(), data, static_cast<size_t>(bytes));
+            if (width > 0) {
+                const int64_t bytes = int64_t{count} * width;
+                block->data = grdAllocArray<unsigned char>(bytes);
+                if (!block->data) {
+                    if (status == F_NO_ERROR) status = grdReportError(h, nullptr, 0, F_ERR_MEMORY, kModule, __LINE__);
+                } else if (bytes > 0) {
+                    std::memcpy(block->data.get(), data, static_cast<size_t>(bytes));
+                }
             }
             return status;
         },

@@ -64,28 +64,6 @@ bool matchesPattern(const char* text, size_t length, char separator, size_t sep1
 bool validDate(const char* text) { return matchesPattern(text, 10, '-', 4, 7); }  // yyyy-mm-dd
 bool validTime(const char* text) { return matchesPattern(text, 8, ':', 2, 5); }   // hh:mm:ss
 
-// The number written at text[at], digits long (the pattern was matched).
-int32_t digitsAt(const char* text, size_t at, size_t digits) {
-    int32_t value = 0;
-    for (size_t i = at; i < at + digits; ++i) value = value * 10 + (text[i] - '0');
-    return value;
-}
-
-// A well-formed date that exists in the proleptic Gregorian calendar (no
-// month 13, no 30 February, 29 February only in leap years).
-bool existingDate(const char* text) {
-    const int32_t year = digitsAt(text, 0, 4), month = digitsAt(text, 5, 2), day = digitsAt(text, 8, 2);
-    if (month < 1 || month > 12 || day < 1) return false;
-    static constexpr int32_t kDays[12] = {31, 28, 31, 30, 31, 30, 31, 31, 30, 31, 30, 31};
-    const bool leap = (year % 4 == 0 && year % 100 != 0) || year % 400 == 0;
-    return day <= kDays[month - 1] + (month == 2 && leap ? 1 : 0);
-}
-
-// A well-formed time of day that exists: 00:00:00 to 23:59:59.
-bool existingTime(const char* text) {
-    return digitsAt(text, 0, 2) < 24 && digitsAt(text, 3, 2) < 60 && digitsAt(text, 6, 2) < 60;
-}
-
 // Sets one of the calendar axes (type 3 or 4).
 int32_t setCalendarAxis(HeaderHandle header, int32_t type, const char* startDate, const char* startTime,
                         int32_t unit, double startOffset, double timeStep, int32_t firstIndex,
@@ -94,19 +72,8 @@ int32_t setCalendarAxis(HeaderHandle header, int32_t type, const char* startDate
     if (status != F_NO_ERROR) return status;
     status = familyStatus(header->fileType, type == F_CAL_EQ_AXIS);
     if (status != F_NO_ERROR) return grdReportError(header, nullptr, 0, status, kModule, line);
-    // A well-formed date or time that does not exist (2024-02-30, 25:61:61)
-    // would give every calendar reader of the file its own idea of the start:
-    // refused before anything changes.
-    if (validDate(startDate) && !existingDate(startDate)) {
-        trace.print("F_ERR_DATE_FORMAT %d", F_ERR_DATE_FORMAT);
-        return grdReportError(header, nullptr, 0, F_ERR_DATE_FORMAT, kModule, line);
-    }
-    if (validDate(startDate) && validTime(startTime) && !existingTime(startTime)) {
-        trace.print("F_ERR_TIME_FORMAT %d", F_ERR_TIME_FORMAT);
-        return grdReportError(header, nullptr, 0, F_ERR_TIME_FORMAT, kModule, line);
-    }
-    // The type is set before the forms of the texts are tested: a malformed
-    // text leaves it set (and a malformed time leaves the new date stored).
+    // The type is set before the texts are tested: a bad text leaves it set
+    // (and a bad time leaves the new date stored).
     GrdTimeAxis& axis = header->timeAxis;
     axis.type = type;
     if (!validDate(startDate)) {

@@ -125,62 +125,30 @@ XsecTable* xsecTableResolve(const XsecTable* table) {
 // ---- Cursors ----------------------------------------------------------------
 
 CTDxRefList::~CTDxRefList() {
-    for (auto& [serial, refs] : tables_)
-        for (CTDxRef* ref : refs) delete ref;
+    for (CTDxRef* ref : refs_) delete ref;
 }
 
-CTDxRef* CTDxRefList::acquire(const CTDxRef* previous, uint64_t tableSerial) {
+CTDxRef* CTDxRefList::add() {
+    auto ref = std::make_unique<CTDxRef>();
     std::lock_guard lock(mutex_);
-    std::list<CTDxRef*>& refs = tables_[tableSerial];
-    CTDxRef* ref = nullptr;
-    const auto known = index_.find(previous);
-    if (known != index_.end() && (*known)->home == tableSerial) {
-        ref = const_cast<CTDxRef*>(*known);
-    } else if (refs.size() >= kCursorsPerTable) {
-        ref = refs.front();
-    } else {
-        auto made = std::make_unique<CTDxRef>();
-        made->home = tableSerial;
-        index_.insert(made.get());
-        try {
-            refs.push_back(made.get());
-        } catch (...) {
-            index_.erase(made.get());
-            throw;
-        }
-        made->slot = std::prev(refs.end());
-        ref = made.release();
+    refs_.push_back(ref.get());
+    try {
+        index_.insert(ref.get());
+    } catch (...) {
+        refs_.pop_back();
+        throw;
     }
-    refs.splice(refs.end(), refs, ref->slot);  // now the most recently used
-    ref->pos = {};
-    ref->tableSerial = 0;
-    return ref;
+    return ref.release();
 }
 
-void CTDxRefList::releaseTable(uint64_t tableSerial) {
+bool CTDxRefList::contains(const CTDxRef* ref) const {
     std::lock_guard lock(mutex_);
-    const auto found = tables_.find(tableSerial);
-    if (found == tables_.end()) return;
-    for (CTDxRef* ref : found->second) {
-        index_.erase(ref);
-        delete ref;
-    }
-    tables_.erase(found);
-}
-
-bool CTDxRefList::use(const CTDxRef* ref) {
-    std::lock_guard lock(mutex_);
-    const auto known = index_.find(ref);
-    if (known == index_.end()) return false;
-    CTDxRef* cursor = const_cast<CTDxRef*>(*known);
-    std::list<CTDxRef*>& refs = tables_[cursor->home];
-    refs.splice(refs.end(), refs, cursor->slot);
-    return true;
+    return index_.count(ref) != 0;
 }
 
 size_t CTDxRefList::size() const {
     std::lock_guard lock(mutex_);
-    return index_.size();
+    return refs_.size();
 }
 
 CTDxRefList& xsecCursors() {
@@ -385,7 +353,6 @@ void TOVA_CALL xfsXsecTableFree(XsecTableHandle* table) {
         *table = nullptr;
         if (t != nullptr) {
             xsecTableUnregister(t);
-            xsecCursors().releaseTable(t->serial);
             delete t;
         }
         return 0;
@@ -436,16 +403,14 @@ int32_t TOVA_CALL xfsXsecWrite(XsecHandle xsec, FileHandle file) {
 XsecHandle TOVA_CALL xfsXsecFind(XsecTableHandle table, const char* primaryName, double keyValue,
                                  const char* secondaryName, XsecCursor* cursor) {
     return tova::guardedValue<XsecHandle>(nullptr, [&]() -> XsecHandle {
-        // The cursor is made (or the caller's one reused) first, whatever
-        // the other arguments.
-        XsecTable* t = xsecTableResolve(table);
+        // The cursor is made first, whatever the arguments.
         CTDxRef* ref = nullptr;
         if (cursor != nullptr) {
-            const CTDxRef* previous = *cursor;
             *cursor = nullptr;
-            ref = xsecCursors().acquire(previous, t != nullptr ? t->serial : 0);
+            ref = xsecCursors().add();
             *cursor = ref;
         }
+        XsecTable* t = xsecTableResolve(table);
         if (t == nullptr || primaryName == nullptr || secondaryName == nullptr) return nullptr;
         if (ref != nullptr) {
             ref->tableSerial = t->serial;
@@ -469,7 +434,7 @@ XsecHandle TOVA_CALL xfsXsecFind(XsecTableHandle table, const char* primaryName,
 XsecHandle TOVA_CALL xfsXsecFindNext(XsecTableHandle table, XsecCursor cursor) {
     return tova::guardedValue<XsecHandle>(nullptr, [&]() -> XsecHandle {
         XsecTable* t = xsecTableResolve(table);
-        if (t == nullptr || cursor == nullptr || !xsecCursors().use(cursor) || cursor->tableSerial != t->serial)
+        if (t == nullptr || cursor == nullptr || !xsecCursors().contains(cursor) || cursor->tableSerial != t->serial)
             return nullptr;
         if (cursor->pos == t->list.end()) return nullptr;
         CTDxSec* sec = *cursor->pos;

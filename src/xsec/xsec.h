@@ -11,7 +11,6 @@
 #include <list>
 #include <memory>
 #include <mutex>
-#include <unordered_map>
 #include <unordered_set>
 #include <vector>
 
@@ -96,48 +95,30 @@ private:
     uint32_t checkSet(XsecSet set, uint32_t n);
 };
 
-// Search cursor: a position in a table's list; the serial ties one to the
-// table it was made on.
+// Search cursor: a position in a table's list. Cursors outlive tables; the
+// serial ties one to the table it was made on.
 struct CTDxRef {
     virtual ~CTDxRef() = default;
     XsecList::iterator pos{};
-    uint64_t tableSerial = 0;  // 0: not on any table (its find was refused)
-    uint64_t home = 0;         // serial of the table whose finds use it (0: none)
-    std::list<CTDxRef*>::iterator slot{};  // its place in its home's recency list
+    uint64_t tableSerial = 0;  // 0: not on any table
 };
 
 // The process-wide owner of every cursor, destroyed when the library is
-// unloaded. Memory stays flat however many finds are made: a find reuses the
-// cursor its caller passes back for the same table; a table keeps at most
-// kCursorsPerTable cursors, the one used (by a find or find-next) longest ago
-// being moved by a further find; and the cursors of a table are freed with it (callers' copies then no
-// longer count as cursors).
+// unloaded.
 class CTDxRefList {
 public:
-    static constexpr size_t kCursorsPerTable = 1024;
-
     CTDxRefList() = default;
     virtual ~CTDxRefList();
     CTDxRefList(const CTDxRefList&) = delete;
     CTDxRefList& operator=(const CTDxRefList&) = delete;
 
-    // The cursor for a find on the table of tableSerial (0: none), cleared
-    // (not on any table): previous itself when it is a cursor of that table
-    // (previous may be anything a caller passes: it is looked up, never read
-    // first); else a new one, or the table's least recently used one when it
-    // has kCursorsPerTable.
-    CTDxRef* acquire(const CTDxRef* previous, uint64_t tableSerial);
-    // Frees the cursors of the table of tableSerial.
-    void releaseTable(uint64_t tableSerial);
-    // Whether ref is a cursor; when it is, it becomes its table's most
-    // recently used one (a walk in progress is never moved by other finds).
-    bool use(const CTDxRef* ref);
+    CTDxRef* add();
+    bool contains(const CTDxRef* ref) const;
     size_t size() const;
 
 private:
     mutable std::mutex mutex_;
-    // Per table, its cursors from least to most recently used.
-    std::unordered_map<uint64_t, std::list<CTDxRef*>> tables_;
+    std::list<CTDxRef*> refs_;
     std::unordered_set<const CTDxRef*> index_;  // membership test for cursors from callers
 };
 CTDxRefList& xsecCursors();

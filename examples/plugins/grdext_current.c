@@ -46,6 +46,7 @@ typedef struct Session {
     int32_t sizes[3];
     float starts[3];
     float steps[3];
+    int64_t fileBytes;     /* length of the file: no stored item is longer */
     void** values;         /* values[k - 1]: item k of the current time step */
     size_t* capacity;      /* bytes allocated for values[k - 1] */
     float* derived[2];     /* speed, direction */
@@ -127,11 +128,21 @@ static int findComponents(Session* s) {
     return grdGetItemElements(grdItemD(s->header, s->uItem)) == grdGetItemElements(grdItemD(s->header, s->vItem));
 }
 
+/* Length of the file, the stream left where it was. */
+static int64_t fileLength(FileHandle file) {
+    const int64_t at = rcfTell64(file);
+    int64_t length;
+    rcfSeek64(file, 0, 0, 2);
+    length = rcfTell64(file);
+    rcfSeek64(file, (uint32_t)((uint64_t)at & 0xFFFFFFFFu), (uint32_t)((uint64_t)at >> 32), 0);
+    return length;
+}
+
 GRD_EXT_EXPORT int TOVA_CALL grdExtInitialize(HeaderHandle header, FileHandle file) {
     Session* s = (Session*)calloc(1, sizeof(Session));
-    (void)file;
     if (s == NULL) return F_ERR_MEMORY;
     s->header = header;
+    s->fileBytes = fileLength(file);
     s->fileItems = grdGetNoOfItems(header);
     if (!findComponents(s) || !takeAxis(s, grdItemD(header, s->uItem))) {
         free(s);
@@ -272,8 +283,12 @@ GRD_EXT_EXPORT int TOVA_CALL grdExtNewTimeStep(HeaderHandle header, FileHandle f
     size_t count;
     if (s == NULL) return F_ERR_ARGUMENT;
     for (k = 1; k <= s->fileItems; ++k) {
-        const int32_t bytes = grdGetItemBytes(grdItemD(header, k));
+        ItemHandle item = grdItemD(header, k);
+        const int32_t bytes = grdGetItemBytes(item);
         if (bytes <= 0) return F_ERR_VALUE;
+        /* The stored values are in the file: a damaged file whose item
+         * claims more gets no buffer of that size. */
+        if (grdGetUsedItemBytes(item) > s->fileBytes) return F_ERR_SIZE;
         if (!reserve(&s->values[k - 1], &s->capacity[k - 1], (size_t)bytes)) return F_ERR_MEMORY;
         status = grdReadItemTimeStep(header, file, &time, s->values[k - 1]);
         if (status != 0) return status;

@@ -625,7 +625,10 @@ TOVA_API int32_t TOVA_CALL grdStaticSkip(FileHandle file);
 
 /* ---- Dynamic time-step data --------------------------------------------------
  * Calls never name an item or a time step: the header's cursor (next item,
- * time steps done) decides, and every write, read or skip advances it. */
+ * time steps done) decides, and every write, read or skip advances it.
+ * A file handle belongs to the header it was created with or read into:
+ * these calls, positioning, flush, close and grdEnablePlugin refuse a file
+ * of another header with 1000 and change nothing. */
 /** Optional: starts the dynamic data explicitly. grdWriteItemTimeStep does it by itself before the first time
  * step; call it only to end the static section of a file that gets no time step now. 2015 for a file open for
  * reading, 2018 for file types other than 1 and 4.

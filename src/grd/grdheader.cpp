@@ -6,6 +6,7 @@
 #include "grd/grdheader.h"
 
 #include <algorithm>
+#include <atomic>
 #include <cstdio>
 #include <cstring>
 #include <initializer_list>
@@ -242,6 +243,11 @@ GrdHeader::~GrdHeader() {
     if (legacy.release != nullptr) legacy.release(this);
 }
 
+uint64_t grdNextHeaderSerial() noexcept {
+    static std::atomic<uint64_t> last{0};
+    return last.fetch_add(1, std::memory_order_relaxed) + 1;
+}
+
 GrdHeader* grdHeaderNew() noexcept { return grdNew<GrdHeader>(); }
 
 int32_t grdHeaderAllocItems(GrdHeader* header, int32_t n) noexcept {
@@ -281,9 +287,16 @@ int32_t grdCheckFile(FileHandle file, const char* module, int32_t line) {
 
 int32_t grdCheckHeaderFile(HeaderHandle header, FileHandle file, const char* module, int32_t line) {
     GrdApiTrace trace("grdCheckHeaderFile");
-    const int32_t status = grdCheckHeader(header, module, line);
-    return trace.done(status != F_NO_ERROR ? status : grdCheckFile(file, module, line));
+    int32_t status = grdCheckHeader(header, module, line);
+    if (status == F_NO_ERROR) status = grdCheckFile(file, module, line);
+    // A header of another file would write its own layout into this one, or
+    // read this one's records as its items.
+    if (status == F_NO_ERROR && file->headerSerial != 0 && file->headerSerial != header->serial)
+        status = grdReportError(header, file, 0, F_ERR_ARGUMENT, module, line);
+    return trace.done(status);
 }
+
+void grdBindFile(const GrdHeader* header, FileHandle file) noexcept { file->headerSerial = header->serial; }
 
 int32_t grdCheckHeaderItemNo(HeaderHandle header, int32_t itemNo, const char* module, int32_t line) {
     GrdApiTrace trace("grdCheckHeaderItemNo %d", itemNo);
@@ -790,6 +803,7 @@ int32_t grdWriteHeader(HeaderHandle header, FileHandle file) {
     GrdApiTrace trace("grdWriteHeader");
     int32_t status = grdCheckHeaderFile(header, file, kModule, __LINE__);
     if (status != F_NO_ERROR) return trace.done(status);
+    grdBindFile(header, file);
     const auto field = [&](uint16_t tag) {
         if (status == F_NO_ERROR)
             status = writeBlock(header, file, tag, __LINE__, [&](OutBlock& b) { fillHeaderField(header, tag, b); });
@@ -1364,6 +1378,7 @@ HeaderHandle grdReadHeader(FileHandle file, int32_t* status) {
         if (code == F_NO_ERROR) file->headerEnd = rcfTell64(file);
     }
     if (code != F_NO_ERROR) header.reset();  // a header that failed is never handed out
+    else grdBindFile(header.get(), file);
     if (status != nullptr) *status = code;
     trace.done(code);
     return header.release();

@@ -256,7 +256,13 @@ struct GrdAttachedState {
     void (*release)(GrdHeader* header) = nullptr;
 };
 
+// A number that no other header of the process has had (never 0).
+uint64_t grdNextHeaderSerial() noexcept;
+
 struct GrdHeader {
+    // Identifies this header to the files created with it or read into it
+    // (RcfFile::headerSerial); unlike the address, never reused.
+    const uint64_t serial = grdNextHeaderSerial();
     int32_t fileType = 0;
     GrdText fileTitle;
     GrdText appTitle;
@@ -381,7 +387,11 @@ GrdItem* grdHeaderItem(GrdHeader* header, int32_t itemNo) noexcept;
 
 int32_t grdCheckHeader(HeaderHandle header, const char* module, int32_t line);
 int32_t grdCheckFile(FileHandle file, const char* module, int32_t line);
+// Header, then file, then that the file was created with or read into this
+// header (1000 for a file of another header; a file of no header passes).
 int32_t grdCheckHeaderFile(HeaderHandle header, FileHandle file, const char* module, int32_t line);
+// Makes file the header's own: later checks refuse it with any other header.
+void grdBindFile(const GrdHeader* header, FileHandle file) noexcept;
 // 1000 for a null header (the number is not looked at), 2007 outside 1..n.
 int32_t grdCheckHeaderItemNo(HeaderHandle header, int32_t itemNo, const char* module, int32_t line);
 int32_t grdCheckItem(ItemHandle item, const char* module, int32_t line);

@@ -441,7 +441,10 @@ extern "C" {
 int32_t TOVA_CALL grdEnablePlugin(HeaderHandle header, FileHandle file) {
     GrdApiTrace trace("grdEnablePlugin");
     return trace.done(tova::guarded([&]() -> int32_t {
-        const int32_t status = grdCheckHeader(header, kModule, __LINE__);
+        // Without a file nothing is loaded (refused below); a file of another
+        // header is a wrong argument.
+        const int32_t status = file != nullptr ? grdCheckHeaderFile(header, file, kModule, __LINE__)
+                                               : grdCheckHeader(header, kModule, __LINE__);
         return status != F_NO_ERROR ? status : enablePlugin(header, file);
     }));
 }

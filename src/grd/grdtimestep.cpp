@@ -308,8 +308,11 @@ int32_t writeItem(GrdHeader* header, FileHandle file, double time, const void* d
 // over the full array.
 int32_t readValues(GrdHeader* header, FileHandle file, const Cursor& c, void* data) {
     uint32_t count = 0;
-    if (rcfQuery(file, &count) >= 1 && count != static_cast<uint64_t>(c.used))
-        return report(header, file, F_ERR_SIZE, __LINE__);
+    const int32_t type = rcfQuery(file, &count);
+    if (type >= 1 && count != static_cast<uint64_t>(c.used)) return report(header, file, F_ERR_SIZE, __LINE__);
+    // A mark of no known kind where the record should be, with the stream
+    // sound: no values follow (the read would give back nothing as success).
+    if (type == 0 && rcfPeekError(file) == 0) return report(header, file, F_ERR_TYPE, __LINE__);
     const auto used = static_cast<uint32_t>(c.used);
     int32_t status = F_NO_ERROR;
     if (!c.compressed()) {

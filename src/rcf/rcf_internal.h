@@ -56,6 +56,11 @@ struct RcfFile {
     // The offset where the header stream ends (-1 before it was written or
     // read): how much an in-place header update reads at once.
     int64_t headerEnd = -1;
+    // For the gridded-data layer: the serial number of the header that the
+    // file was created with or read into (0: none yet). Data calls with any
+    // other header are refused, so that one file never receives the layout
+    // of another.
+    uint64_t headerSerial = 0;
 
     RcfFile() = default;
     RcfFile(const RcfFile&) = delete;

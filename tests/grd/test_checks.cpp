@@ -6,6 +6,7 @@
 #include <string>
 
 #include "grd/grdio.h"
+#include "rcf/rcf_internal.h"
 #include "test_header_support.h"
 
 // Absurd sizes must come back as 2000 under AddressSanitizer too, as they do
@@ -20,7 +21,8 @@ using grdtest::GrdTest;
 class Checks : public GrdTest {};
 
 TEST_F(Checks, NullArgumentsGive1000ThroughTheDispatcherWithTheCallersModule) {
-    auto* file = reinterpret_cast<FileHandle>(0x20);
+    RcfFile unbound;  // a file of no header
+    FileHandle file = &unbound;
     GrdHeader header;
     GrdItem item;
     GrdCustomBlock block;
@@ -43,7 +45,8 @@ TEST_F(Checks, NullArgumentsGive1000ThroughTheDispatcherWithTheCallersModule) {
 }
 
 TEST_F(Checks, CompositeChecksStopAtTheFirstFailure) {
-    auto* file = reinterpret_cast<FileHandle>(0x20);
+    RcfFile unbound;  // a file of no header
+    FileHandle file = &unbound;
     GrdHeader header;
     GrdItem vector;
     EXPECT_EQ(grdCheckHeaderFile(nullptr, nullptr, "m", 1), 1000);

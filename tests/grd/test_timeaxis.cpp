@@ -5,6 +5,8 @@
 #include <initializer_list>
 #include <string>
 
+#include "common/testutil.h"
+#include "grd/fileio.h"
 #include "test_header_support.h"
 
 namespace {
@@ -214,7 +216,10 @@ TEST_F(TimeAxis, DateArithmeticIsProlepticGregorian) {
 
 TEST_F(TimeAxis, SpanOfEquidistantAxesCountsOneStepPastTheLast) {
     HeaderHandle h = makeHeader(F_EQTIME_FIXEDSPACE_ALLITEMS);
-    auto* file = reinterpret_cast<FileHandle>(0x40);
+    // A file of no header: the equidistant kinds never read it.
+    testutil::TempDir dir;
+    FileHandle file = FOpenFileCreate(dir.file("span.grd").c_str(), 0);
+    ASSERT_NE(file, nullptr);
     double span = 0;
     EXPECT_EQ(_grdGetTimeAxisSpan(h, file, &span), 0);  // no time axis
     EXPECT_EQ(span, F_DELETE_VALUE_DOUBLE);
@@ -230,6 +235,7 @@ TEST_F(TimeAxis, SpanOfEquidistantAxesCountsOneStepPastTheLast) {
     EXPECT_EQ(span, F_DELETE_VALUE_DOUBLE);
     EXPECT_EQ(_grdGetTimeAxisSpan(nullptr, file, &span), 1000);
     EXPECT_EQ(takeCodes(), (Codes{1000, 1000}));
+    FCloseFile(&file);
 }
 
 }  // namespace

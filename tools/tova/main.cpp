@@ -1,6 +1,7 @@
 // The tova command-line tool: subcommands and their options (CLI11), and the
 // exit codes: 0 success, 1 a damaged file or a command that failed, 2 bad
-// usage. Each subcommand lives in its own source file.
+// usage. Each subcommand lives in its own source file; tova_cli::run() is
+// the entry that the executable's main() calls.
 #include <cstdio>
 #include <exception>
 #include <new>
@@ -77,7 +78,7 @@ std::string versionText() {
            ")";
 }
 
-int run(int argc, char** argv) {
+int dispatch(int argc, char** argv) {
     CLI::App app{"Looks into the data files of the tova library: gridded data, cross sections, VRE files.", "tova"};
     app.set_version_flag("--version", versionText());
     app.require_subcommand(1);
@@ -186,9 +187,9 @@ int run(int argc, char** argv) {
 
 }  // namespace
 
-int main(int argc, char** argv) {
+int tova_cli::run(int argc, char** argv) {
     try {
-        return run(argc, argv);
+        return dispatch(argc, argv);
     } catch (const Failure& e) {
         std::fprintf(stderr, "tova: %s\n", e.what());
     } catch (const std::bad_alloc&) {

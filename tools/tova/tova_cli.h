@@ -66,6 +66,11 @@ RecordFileInfo probeRecordFile(const std::string& path);
 // The record-file part of `info`: kind, tag, versions, stamps, bases.
 Value describeRecordFile(const RecordFileInfo& file);
 
+// The whole tool: parses the command line (argv[0] is the program name),
+// runs the subcommand and returns the exit code. Failures of a command are
+// printed on standard error; no exception leaves it.
+int run(int argc, char** argv);
+
 // Subcommands (main.cpp wires their options). Each returns the exit code.
 struct InfoOptions {
     std::string file;
